@@ -1,0 +1,208 @@
+// Per-thread event queues and callback dispatch.
+//
+// Each thread owns a queue that any thread may post to, and a table of
+// callbacks that only the thread itself touches. Events are popped one at a
+// time under the queue lock and dispatched with the lock released, so a
+// callback may post, pump again (nested) or install callbacks freely.
+
+#include <KD/kdext.h>
+
+#include <pal/Simulation.h>
+
+#include <chrono>
+#include <vector>
+
+#include "Runtime.h"
+#include "ThreadRecord.h"
+
+namespace pal::detail {
+
+namespace {
+
+KDCallbackFunc* findCallback(KDThread* self, const KDEvent& event) {
+    auto exact = self->callbacks.find({event.type, event.userptr});
+    if (exact != self->callbacks.end()) {
+        return exact->second;
+    }
+    auto fallback = self->callbacks.find({event.type, nullptr});
+    return fallback != self->callbacks.end() ? fallback->second : nullptr;
+}
+
+QueuedEvent* popEvent(KDThread* self) {
+    std::lock_guard<std::mutex> lock(self->queueMutex);
+    if (self->queue.empty()) {
+        return nullptr;
+    }
+    QueuedEvent* queued = self->queue.front();
+    self->queue.pop_front();
+    return queued;
+}
+
+// Runs what the event asks for. Returns false, keeping the event, when no
+// callback takes it; the event is freed otherwise.
+bool dispatch(KDThread* self, QueuedEvent* queued) {
+    if (queued->action) {
+        queued->action();
+        delete queued;
+        return true;
+    }
+    KDCallbackFunc* callback = findCallback(self, queued->event);
+    if (callback == nullptr) {
+        return false;
+    }
+    callback(&queued->event);
+    delete queued;
+    return true;
+}
+
+std::size_t queueLength(KDThread* self) {
+    std::lock_guard<std::mutex> lock(self->queueMutex);
+    return self->queue.size();
+}
+
+}  // namespace
+
+void post(KDThread* thread, KDEvent* event) {
+    QueuedEvent* queued = queuedEventOf(event);
+    {
+        std::lock_guard<std::mutex> lock(thread->queueMutex);
+        thread->queue.push_back(queued);
+    }
+    thread->queueChanged.notify_one();
+}
+
+void discardEvents(KDThread* thread, const std::function<bool(const KDEvent&)>& match) {
+    std::vector<QueuedEvent*> discarded;
+    {
+        std::lock_guard<std::mutex> lock(thread->queueMutex);
+        auto& queue = thread->queue;
+        for (auto it = queue.begin(); it != queue.end();) {
+            if (match((*it)->event)) {
+                discarded.push_back(*it);
+                it = queue.erase(it);
+            } else {
+                ++it;
+            }
+        }
+    }
+    for (QueuedEvent* queued : discarded) {
+        delete queued;
+    }
+}
+
+void discardAllEvents(KDThread* thread) {
+    discardEvents(thread, [](const KDEvent&) { return true; });
+}
+
+void pumpThread(KDThread* self) {
+    // Only what is queued now: a callback that keeps re-posting must not keep
+    // one pump going forever.
+    std::size_t budget = queueLength(self);
+    for (; budget > 0; --budget) {
+        QueuedEvent* queued = popEvent(self);
+        if (queued == nullptr) {
+            break;
+        }
+        if (!dispatch(self, queued)) {
+            delete queued;  // nobody listens: dropped, as OpenKODE does for kdPumpEvents
+        }
+    }
+}
+
+}  // namespace pal::detail
+
+using pal::detail::QueuedEvent;
+
+extern "C" {
+
+KDEvent* kdCreateEvent(void) { return &(new QueuedEvent())->event; }
+
+void kdFreeEvent(KDEvent* event) {
+    if (event != nullptr) {
+        delete pal::detail::queuedEventOf(event);
+    }
+}
+
+KDint kdPostEvent(KDEvent* event) { return kdPostThreadEvent(event, kdThreadSelf()); }
+
+KDint kdPostThreadEvent(KDEvent* event, KDThread* thread) {
+    if (event == nullptr || thread == nullptr) {
+        kdSetError(KD_EINVAL);
+        return -1;
+    }
+    pal::detail::post(thread, event);
+    return 0;
+}
+
+KDint kdInstallCallback(KDCallbackFunc* func, KDint eventtype, void* eventuserptr) {
+    KDThread* self = kdThreadSelf();
+    if (func != nullptr) {
+        self->callbacks[{eventtype, eventuserptr}] = func;
+        return 0;
+    }
+    self->callbacks.erase({eventtype, eventuserptr});
+    // The owner of userptr is going away: its pending events must not reach a
+    // later object that happens to get the same address.
+    if (eventuserptr != nullptr) {
+        pal::detail::discardEvents(self, [eventtype, eventuserptr](const KDEvent& event) {
+            return event.type == eventtype && event.userptr == eventuserptr;
+        });
+    }
+    return 0;
+}
+
+void kdPumpEvents(void) {
+    KDThread* self = kdThreadSelf();
+    pal::detail::fireDueTimers(self);
+    pal::detail::pumpThread(self);
+}
+
+const KDEvent* kdWaitEvent(KDust timeout) {
+    KDThread* self = kdThreadSelf();
+    delete self->lastReturned;
+    self->lastReturned = nullptr;
+
+    const bool forever = timeout == static_cast<KDust>(-1);
+    const KDust deadline = forever ? 0 : kdGetTimeUST() + timeout;
+    for (;;) {
+        pal::detail::fireDueTimers(self);
+        bool dispatchedAny = false;
+        while (QueuedEvent* queued = pal::detail::popEvent(self)) {
+            if (!pal::detail::dispatch(self, queued)) {
+                self->lastReturned = queued;
+                return &queued->event;
+            }
+            dispatchedAny = true;
+        }
+        if (dispatchedAny) {
+            return nullptr;
+        }
+        const KDust now = kdGetTimeUST();
+        if (!forever && now >= deadline) {
+            return nullptr;
+        }
+        KDint64 wait = pal::detail::nanosUntilNextTimer(self);
+        if (!forever && (wait < 0 || static_cast<KDust>(wait) > deadline - now)) {
+            wait = static_cast<KDint64>(deadline - now);
+        }
+        std::unique_lock<std::mutex> lock(self->queueMutex);
+        if (!self->queue.empty()) {
+            continue;
+        }
+        // On the virtual clock a wait ends only by an event or by advanceTime
+        // waking every thread; real time plays no part.
+        if (wait < 0 || pal::isVirtualClock()) {
+            self->queueChanged.wait(lock);
+        } else {
+            self->queueChanged.wait_for(lock, std::chrono::nanoseconds(wait));
+        }
+    }
+}
+
+void kdDefaultEvent(const KDEvent* event) {
+    if (event != nullptr && event->type == KD_EVENT_QUIT && !pal::exitRequested()) {
+        kdExit(0);
+    }
+}
+
+}  // extern "C"

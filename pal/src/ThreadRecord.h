@@ -1,0 +1,76 @@
+// Internal: what the platform layer keeps per thread, and the queued form of
+// an event. Shared by Threads.cpp, Events.cpp and Timers.cpp.
+#pragma once
+
+#include <KD/kd.h>
+#include <pthread.h>
+
+#include <atomic>
+#include <condition_variable>
+#include <deque>
+#include <functional>
+#include <mutex>
+#include <unordered_map>
+#include <utility>
+
+namespace pal::detail {
+
+// An event as it sits in a queue. KDEvent comes first so that the KDEvent*
+// handed to callers converts back to the record.
+struct QueuedEvent {
+    KDEvent event{};
+    KDTimer* timer = nullptr;              // set for timer events, so cancelling purges them
+    std::function<void()> action;          // set for scheduled actions; run instead of dispatch
+};
+
+inline QueuedEvent* queuedEventOf(KDEvent* event) { return reinterpret_cast<QueuedEvent*>(event); }
+
+struct CallbackKeyHash {
+    std::size_t operator()(const std::pair<KDint, void*>& key) const {
+        return std::hash<void*>()(key.second) * 31u + std::hash<KDint>()(key.first);
+    }
+};
+
+}  // namespace pal::detail
+
+// One per thread that has touched the platform layer.
+struct KDThread {
+    // Guards queue; posting threads take it, the owner pops under it.
+    std::mutex queueMutex;
+    std::condition_variable queueChanged;
+    std::deque<pal::detail::QueuedEvent*> queue;
+
+    // Owner-only state: only the thread itself installs and dispatches.
+    std::unordered_map<std::pair<KDint, void*>, KDCallbackFunc*, pal::detail::CallbackKeyHash> callbacks;
+    pal::detail::QueuedEvent* lastReturned = nullptr;  // kdWaitEvent's result, freed at the next call
+
+    pthread_t handle{};
+    void* (*startRoutine)(void*) = nullptr;
+    void* startArgument = nullptr;
+    void* result = nullptr;
+    std::atomic<bool> detached{false};
+    std::atomic<KDint> schedPolicy{0};
+    std::atomic<KDint> schedParam{0};
+
+    ~KDThread();
+};
+
+namespace pal::detail {
+
+// The calling thread's record, created on first use for threads the layer did
+// not start (the process's main thread, test threads).
+KDThread* currentThread();
+// Wakes every thread blocked in kdWaitEvent so it re-reads the clock.
+void wakeAllThreads();
+// Pops and dispatches queued events; used by kdPumpEvents and advanceTime.
+void pumpThread(KDThread* self);
+// Fires the calling thread's due timers into its own queue (Timers.cpp).
+void fireDueTimers(KDThread* self);
+// Nanoseconds until the thread's next timer is due, or -1 when none (Timers.cpp).
+KDint64 nanosUntilNextTimer(KDThread* self);
+// Frees every event queued for the thread (Events.cpp).
+void discardAllEvents(KDThread* thread);
+// Starts the count behind pal::timerFireCount again (Timers.cpp).
+void resetTimerFireCount();
+
+}  // namespace pal::detail

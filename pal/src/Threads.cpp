@@ -1,0 +1,216 @@
+// Threads, recursive mutexes, conditions and scheduling classes on pthreads.
+
+#include <KD/kdext.h>
+#include <sched.h>
+
+#include <memory>
+#include <mutex>
+#include <set>
+
+#include "Runtime.h"
+#include "ThreadRecord.h"
+
+namespace {
+
+// Every live thread record, so that advancing the virtual clock can wake the
+// threads waiting on it.
+std::mutex& registryMutex() {
+    static std::mutex mutex;
+    return mutex;
+}
+std::set<KDThread*>& registry() {
+    static std::set<KDThread*> threads;
+    return threads;
+}
+
+void registerThread(KDThread* thread) {
+    std::lock_guard<std::mutex> lock(registryMutex());
+    registry().insert(thread);
+}
+
+// Records of threads the layer started are owned by kdThreadJoin (or by the
+// thread itself when detached); records of other threads by this holder.
+thread_local KDThread* t_current = nullptr;
+thread_local std::unique_ptr<KDThread> t_adopted;
+
+void* threadTrampoline(void* argument) {
+    KDThread* self = static_cast<KDThread*>(argument);
+    t_current = self;
+    self->result = self->startRoutine(self->startArgument);
+    t_current = nullptr;
+    if (self->detached.load()) {
+        delete self;
+    }
+    return nullptr;
+}
+
+int policyToPosix(KDint policy) { return policy == KD_THREAD_POLICY_BACKGROUND_ZVR ? SCHED_IDLE : SCHED_OTHER; }
+
+}  // namespace
+
+KDThread::~KDThread() {
+    {
+        std::lock_guard<std::mutex> lock(registryMutex());
+        registry().erase(this);
+    }
+    pal::detail::discardAllEvents(this);
+    delete lastReturned;
+}
+
+namespace pal::detail {
+
+KDThread* currentThread() {
+    if (t_current == nullptr) {
+        t_adopted = std::make_unique<KDThread>();
+        t_adopted->handle = pthread_self();
+        t_current = t_adopted.get();
+        registerThread(t_current);
+    }
+    return t_current;
+}
+
+void wakeAllThreads() {
+    std::lock_guard<std::mutex> lock(registryMutex());
+    for (KDThread* thread : registry()) {
+        // Taking the queue lock orders the wake-up after a waiter's check.
+        { std::lock_guard<std::mutex> queueLock(thread->queueMutex); }
+        thread->queueChanged.notify_all();
+    }
+}
+
+}  // namespace pal::detail
+
+extern "C" {
+
+KDThread* kdThreadCreate(const KDThreadAttr*, void* (*start_routine)(void*), void* arg) {
+    KDThread* thread = new KDThread();
+    thread->startRoutine = start_routine;
+    thread->startArgument = arg;
+    registerThread(thread);
+    if (pthread_create(&thread->handle, nullptr, threadTrampoline, thread) != 0) {
+        delete thread;
+        kdSetError(KD_ENOMEM);
+        return nullptr;
+    }
+    return thread;
+}
+
+KDint kdThreadJoin(KDThread* thread, void** retval) {
+    if (thread == nullptr || pthread_join(thread->handle, nullptr) != 0) {
+        kdSetError(KD_EINVAL);
+        return -1;
+    }
+    if (retval != nullptr) {
+        *retval = thread->result;
+    }
+    delete thread;
+    return 0;
+}
+
+KDint kdThreadDetach(KDThread* thread) {
+    if (thread == nullptr) {
+        kdSetError(KD_EINVAL);
+        return -1;
+    }
+    thread->detached.store(true);
+    pthread_detach(thread->handle);
+    return 0;
+}
+
+KDThread* kdThreadSelf(void) { return pal::detail::currentThread(); }
+
+KDboolean kdThreadIsMainZVR(void) {
+    return pal::detail::mainThread() != nullptr && pal::detail::mainThread() == kdThreadSelf();
+}
+
+void kdThreadYieldZVR(void) { sched_yield(); }
+
+KDint kdThreadGetSchedParamZVR(KDThread* thread, KDint* policy, KDint* param) {
+    if (thread == nullptr) {
+        kdSetError(KD_EINVAL);
+        return -1;
+    }
+    if (policy != nullptr) {
+        *policy = thread->schedPolicy.load();
+    }
+    if (param != nullptr) {
+        *param = thread->schedParam.load();
+    }
+    return 0;
+}
+
+KDint kdThreadSetSchedParamZVR(KDThread* thread, KDint policy, const KDint* param) {
+    if (thread == nullptr || param == nullptr ||
+        (policy != KD_THREAD_POLICY_NORMAL_ZVR && policy != KD_THREAD_POLICY_BACKGROUND_ZVR)) {
+        kdSetError(KD_EINVAL);
+        return -1;
+    }
+    // Both Linux classes used here take priority 0; the parameter is kept so
+    // that a caller restoring saved parameters gets back what it read.
+    sched_param posixParam{};
+    posixParam.sched_priority = 0;
+    if (pthread_setschedparam(thread->handle, policyToPosix(policy), &posixParam) != 0) {
+        kdSetError(KD_EACCES);
+        return -1;
+    }
+    thread->schedPolicy.store(policy);
+    thread->schedParam.store(*param);
+    return 0;
+}
+
+struct KDThreadMutex {
+    pthread_mutex_t mutex;
+};
+
+struct KDThreadCond {
+    pthread_cond_t cond;
+};
+
+KDThreadMutex* kdThreadMutexCreate(const void*) {
+    KDThreadMutex* mutex = new KDThreadMutex();
+    pthread_mutexattr_t attributes;
+    pthread_mutexattr_init(&attributes);
+    // Recursive always: the network manager re-locks its mutex on the same thread.
+    pthread_mutexattr_settype(&attributes, PTHREAD_MUTEX_RECURSIVE);
+    pthread_mutex_init(&mutex->mutex, &attributes);
+    pthread_mutexattr_destroy(&attributes);
+    return mutex;
+}
+
+KDint kdThreadMutexFree(KDThreadMutex* mutex) {
+    if (mutex == nullptr) {
+        return 0;
+    }
+    pthread_mutex_destroy(&mutex->mutex);
+    delete mutex;
+    return 0;
+}
+
+KDint kdThreadMutexLock(KDThreadMutex* mutex) { return pthread_mutex_lock(&mutex->mutex) == 0 ? 0 : -1; }
+
+KDint kdThreadMutexUnlock(KDThreadMutex* mutex) { return pthread_mutex_unlock(&mutex->mutex) == 0 ? 0 : -1; }
+
+KDThreadCond* kdThreadCondCreate(const void*) {
+    KDThreadCond* cond = new KDThreadCond();
+    pthread_cond_init(&cond->cond, nullptr);
+    return cond;
+}
+
+KDint kdThreadCondFree(KDThreadCond* cond) {
+    if (cond == nullptr) {
+        return 0;
+    }
+    pthread_cond_destroy(&cond->cond);
+    delete cond;
+    return 0;
+}
+
+KDint kdThreadCondSignal(KDThreadCond* cond) { return pthread_cond_signal(&cond->cond) == 0 ? 0 : -1; }
+
+KDint kdThreadCondBroadcast(KDThreadCond* cond) { return pthread_cond_broadcast(&cond->cond) == 0 ? 0 : -1; }
+
+KDint kdThreadCondWait(KDThreadCond* cond, KDThreadMutex* mutex) {
+    return pthread_cond_wait(&cond->cond, &mutex->mutex) == 0 ? 0 : -1;
+}
+
+}  // extern "C"
