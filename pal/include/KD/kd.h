@@ -272,11 +272,24 @@ KDint kdTruncate(const KDchar *pathname, KDoff length);
 
 #define KD_ISREG(m) (((m)&0x8000) != 0)
 #define KD_ISDIR(m) (((m)&0x4000) != 0)
+/* glibc's <sys/stat.h> (which gtest and others include) defines st_mtime as
+ * a macro for st_mtim.tv_sec. The field keeps its name whatever the include
+ * order: the macro is kept out of the declaration, and where it is in force,
+ * st_mtim.tv_sec names the same storage. */
+typedef struct KDStatTimeZVR {
+    KDtime tv_sec;
+} KDStatTimeZVR;
+#pragma push_macro("st_mtime")
+#undef st_mtime
 typedef struct KDStat {
     KDmode st_mode;
     KDoff st_size;
-    KDtime st_mtime;
+    union {
+        KDtime st_mtime;
+        KDStatTimeZVR st_mtim;
+    };
 } KDStat;
+#pragma pop_macro("st_mtime")
 KDint kdStat(const KDchar *pathname, KDStat *buf);
 KDint kdFstat(KDFile *file, KDStat *buf);
 
