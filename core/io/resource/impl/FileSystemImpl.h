@@ -1,0 +1,22 @@
+#pragma once
+
+#include "io/resource/FileSystem.h"
+#include "io/zip/ZipEntry.h"
+
+namespace IO {
+namespace Resource {
+
+// The package index: entry name to entry, filled once from the central directory and never
+// changed afterwards, so any thread may read it.
+class FileSystemImpl : public FileSystem {
+public:
+    explicit FileSystemImpl(const Zip::ZipEntryMap& entries) : entries(entries) {}
+
+    const Zip::ZipEntryMap& getEntries() const { return entries; }
+
+private:
+    const Zip::ZipEntryMap entries;
+};
+
+}  // namespace Resource
+}  // namespace IO

@@ -1,0 +1,63 @@
+#pragma once
+
+#include <minizip/unzip.h>
+
+#include <boost/enable_shared_from_this.hpp>
+#include <boost/noncopyable.hpp>
+#include <boost/shared_ptr.hpp>
+#include <string>
+
+#include "io/InputStream.h"
+#include "io/zip/ZipEntry.h"
+
+namespace IO {
+namespace Zip {
+
+// Reads a zip archive through an InputStream and opens its entries as streams. Always owned
+// through a shared_ptr: entry streams that still read the archive keep it alive.
+// Not thread-safe: one thread uses a zip file and its streams at a time.
+class ZipFile : public boost::enable_shared_from_this<ZipFile>, private boost::noncopyable {
+public:
+    ZipFile();
+    ~ZipFile();
+
+    // Opens the archive. With preparedEntries (an index made earlier from the same archive)
+    // the central directory is not read again; that index is used in place and must outlive
+    // this zip file. False, with an assertion failure, when the archive cannot be read.
+    bool init(boost::shared_ptr<InputStream> archive, const ZipEntryMap* preparedEntries);
+
+    // Exact, case-sensitive lookup; null when absent.
+    const ZipEntry* findEntry(const std::string& name) const;
+    const ZipEntryMap& getEntries() const { return *index; }
+
+    // A stored entry comes as a window of the archive stream whatever cached says; a compressed
+    // one either inflated whole into memory (cached) or inflated while read (uncached, one at a
+    // time per zip file). Empty, with an assertion failure, when the entry cannot be opened.
+    boost::shared_ptr<InputStream> getInputStream(const ZipEntry& entry, bool cached);
+
+private:
+    friend class UncachedZipInputStream;
+
+    bool buildIndex();
+    bool readCurrentEntry(ZipEntry& entry);
+    boost::shared_ptr<InputStream> inflateWhole(const ZipEntry& entry);
+
+    static voidpf ZCALLBACK openFile(voidpf opaque, const void* filename, int mode);
+    static uLong ZCALLBACK readFile(voidpf opaque, voidpf stream, void* buffer, uLong size);
+    static uLong ZCALLBACK writeFile(voidpf opaque, voidpf stream, const void* buffer, uLong size);
+    static ZPOS64_T ZCALLBACK tellFile(voidpf opaque, voidpf stream);
+    static long ZCALLBACK seekFile(voidpf opaque, voidpf stream, ZPOS64_T offset, int origin);
+    static int ZCALLBACK closeFile(voidpf opaque, voidpf stream);
+    static int ZCALLBACK testError(voidpf opaque, voidpf stream);
+
+    // Uncached entry streams open now (0 or 1): such a stream owns minizip's current entry.
+    int openStreams = 0;
+    boost::shared_ptr<InputStream> stream;
+    unzFile file = nullptr;
+    zlib_filefunc64_def functions;
+    ZipEntryMap entries;
+    const ZipEntryMap* index = &entries;
+};
+
+}  // namespace Zip
+}  // namespace IO
