@@ -1,0 +1,176 @@
+// The graphics context of the desktop platform layer: real OpenGL ES 1.1
+// rendering into the simulated main context, read back pixel by pixel.
+#include <GLES/gl.h>
+#include <KD/kdext.h>
+#include <gtest/gtest.h>
+#include <pal/Simulation.h>
+
+#include <cstdint>
+#include <cstdlib>
+#include <filesystem>
+#include <string>
+#include <vector>
+
+namespace {
+
+struct Colour {
+    std::uint8_t r, g, b, a;
+};
+
+// What the handlers draw and how often each view's handler ran.
+Colour gClearColour{0, 0, 0, 255};
+int gCallsA = 0;
+int gCallsB = 0;
+KDViewProxyZVR gViewA;
+KDViewProxyZVR gViewB;
+
+void clearToColour() {
+    glClearColor(gClearColour.r / 255.0f, gClearColour.g / 255.0f, gClearColour.b / 255.0f,
+                 gClearColour.a / 255.0f);
+    glClear(GL_COLOR_BUFFER_BIT | GL_DEPTH_BUFFER_BIT);
+}
+
+void drawA(KDViewProxyZVR* view) {
+    EXPECT_EQ(view, &gViewA);
+    ++gCallsA;
+    clearToColour();
+}
+
+void drawB(KDViewProxyZVR*) {
+    ++gCallsB;
+}
+
+void drawAndRequestAgain(KDViewProxyZVR* view) {
+    ++gCallsA;
+    clearToColour();
+    kdGFXRequestRedraw(view);
+}
+
+class GraphicsTest : public ::testing::Test {
+protected:
+    void SetUp() override {
+        std::string pattern = (std::filesystem::temp_directory_path() / "pal-gfx-XXXXXX").string();
+        ASSERT_NE(mkdtemp(pattern.data()), nullptr);
+        root = pattern;
+        pal::setFileRoot(root);
+        pal::resetSimulation();
+        pal::useVirtualClock();
+        pal::setLogSink([this](const char* line) { log.push_back(line); });
+        pal::start();
+        gClearColour = {0, 0, 0, 255};
+        gCallsA = 0;
+        gCallsB = 0;
+    }
+
+    void TearDown() override {
+        kdGFXSetRedrawHandler(&gViewA, nullptr);
+        kdGFXSetRedrawHandler(&gViewB, nullptr);
+        pal::shutdown();
+        pal::resetSimulation();
+        pal::setLogSink(pal::LogSink());
+        std::filesystem::remove_all(root);
+    }
+
+    // Reads the frame and checks that every pixel has the colour.
+    void expectFrame(int expectedWidth, int expectedHeight, Colour colour) {
+        std::vector<std::uint8_t> rgba;
+        int width = 0;
+        int height = 0;
+        ASSERT_TRUE(pal::readFrame(rgba, width, height));
+        ASSERT_EQ(width, expectedWidth);
+        ASSERT_EQ(height, expectedHeight);
+        ASSERT_EQ(rgba.size(), static_cast<std::size_t>(width) * height * 4);
+        int wrong = 0;
+        for (std::size_t i = 0; i < rgba.size(); i += 4) {
+            if (rgba[i] != colour.r || rgba[i + 1] != colour.g || rgba[i + 2] != colour.b ||
+                rgba[i + 3] != colour.a) {
+                ++wrong;
+            }
+        }
+        EXPECT_EQ(wrong, 0) << "first pixel " << int(rgba[0]) << "," << int(rgba[1]) << "," << int(rgba[2])
+                            << "," << int(rgba[3]);
+    }
+
+    std::string root;
+    std::vector<std::string> log;
+};
+
+TEST_F(GraphicsTest, QueryAnswersTheSimulatedSizeWithoutAContext) {
+    KDint value = 0;
+    EXPECT_NE(kdGFXQueryMainContextZVR(&gViewA, KD_GFX_WIDTH_ZVR, &value), 0);
+    EXPECT_EQ(value, 480);
+    EXPECT_NE(kdGFXQueryMainContextZVR(&gViewA, KD_GFX_HEIGHT_ZVR, &value), 0);
+    EXPECT_EQ(value, 800);
+
+    pal::setContextSize(320, 240);
+    pal::setContextSize(0, 100);  // refused: the size stays
+    EXPECT_NE(kdGFXQueryMainContextZVR(&gViewA, KD_GFX_WIDTH_ZVR, &value), 0);
+    EXPECT_EQ(value, 320);
+    EXPECT_EQ(kdGFXQueryMainContextZVR(&gViewA, 3, &value), 0);
+    EXPECT_EQ(kdGFXQueryMainContextZVR(&gViewA, KD_GFX_WIDTH_ZVR, nullptr), 0);
+
+    std::vector<std::uint8_t> rgba;
+    int width = 0;
+    int height = 0;
+    EXPECT_FALSE(pal::readFrame(rgba, width, height));
+}
+
+TEST_F(GraphicsTest, RepeatedRequestsAreServedByOneHandlerCallThatDrawsIntoTheFrame) {
+    pal::setContextSize(64, 32);
+    gClearColour = {255, 128, 0, 255};
+    kdGFXSetRedrawHandler(&gViewA, drawA);
+    kdGFXRequestRedraw(&gViewA);
+    kdGFXRequestRedraw(&gViewA);
+    EXPECT_EQ(gCallsA, 0);  // served from the event loop, not from the request
+
+    kdPumpEvents();
+    kdPumpEvents();
+    EXPECT_EQ(gCallsA, 1);
+    EXPECT_EQ(pal::redrawCount(), 1);
+    expectFrame(64, 32, gClearColour);
+}
+
+TEST_F(GraphicsTest, SizeChangeTakesEffectAtTheNextRedraw) {
+    pal::setContextSize(16, 16);
+    kdGFXSetRedrawHandler(&gViewA, drawA);
+    kdGFXRequestRedraw(&gViewA);
+    kdPumpEvents();
+    expectFrame(16, 16, gClearColour);
+
+    pal::setContextSize(40, 24);
+    expectFrame(16, 16, gClearColour);
+    gClearColour = {0, 0, 255, 255};
+    kdGFXRequestRedraw(&gViewA);
+    kdPumpEvents();
+    expectFrame(40, 24, gClearColour);
+    EXPECT_EQ(pal::redrawCount(), 2);
+}
+
+TEST_F(GraphicsTest, AHandlerMayRequestItsNextFrame) {
+    pal::setContextSize(8, 8);
+    kdGFXSetRedrawHandler(&gViewA, drawAndRequestAgain);
+    kdGFXRequestRedraw(&gViewA);
+    kdPumpEvents();
+    EXPECT_EQ(gCallsA, 1);
+    kdPumpEvents();
+    EXPECT_EQ(gCallsA, 2);
+}
+
+TEST_F(GraphicsTest, EachViewGetsItsOwnHandlerAndRemovedHandlersAreNotCalled) {
+    pal::setContextSize(8, 8);
+    kdGFXSetRedrawHandler(&gViewA, drawA);
+    kdGFXSetRedrawHandler(&gViewB, drawB);
+    kdGFXRequestRedraw(&gViewA);
+    kdGFXRequestRedraw(&gViewB);
+    kdPumpEvents();
+    EXPECT_EQ(gCallsA, 1);
+    EXPECT_EQ(gCallsB, 1);
+
+    kdGFXRequestRedraw(&gViewB);
+    kdGFXSetRedrawHandler(&gViewB, nullptr);
+    kdPumpEvents();
+    EXPECT_EQ(gCallsB, 1);
+    EXPECT_EQ(pal::redrawCount(), 2);
+}
+
+}  // namespace
