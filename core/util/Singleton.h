@@ -1,0 +1,38 @@
+#pragma once
+
+#include "util/SingletonBase.h"
+#include "util/SingletonStorage.h"
+
+namespace Util {
+
+// A lazily created process-wide service, deleted by the singleton store at
+// shutdown; T derives from Singleton<T>. Main thread only (or first touched
+// before other threads start).
+template <class T>
+class Singleton : public SingletonBase {
+public:
+    static T* getInstance() {
+        if (instance == nullptr) {
+            T* created = new T();
+            SingletonStorage::addSingleton(created);
+            instance = created;
+        }
+        return instance;
+    }
+
+protected:
+    Singleton() {}
+    // Cleared here so that a later getInstance() makes a new object.
+    ~Singleton() override { instance = nullptr; }
+
+private:
+    Singleton(const Singleton&) = delete;
+    Singleton& operator=(const Singleton&) = delete;
+
+    static T* instance;
+};
+
+template <class T>
+T* Singleton<T>::instance = nullptr;
+
+}  // namespace Util
