@@ -1,0 +1,2 @@
+# GeographicLib is the independent reference the distance model is checked against.
+target_link_libraries(${target} PRIVATE PkgConfig::GEOGRAPHICLIB)
