@@ -186,7 +186,9 @@ const KDEvent* kdWaitEvent(KDust timeout) {
             wait = static_cast<KDint64>(deadline - now);
         }
         std::unique_lock<std::mutex> lock(self->queueMutex);
-        if (!self->queue.empty()) {
+        // Checked again under the lock: advanceTime wakes waiters under it, so
+        // a time step between the check above and the wait is not missed.
+        if (!self->queue.empty() || (!forever && kdGetTimeUST() >= deadline)) {
             continue;
         }
         // On the virtual clock a wait ends only by an event or by advanceTime
