@@ -1,0 +1,32 @@
+#include <gtest/gtest.h>
+
+#include "math/Color.h"
+
+using Math::Color;
+
+TEST(ColorTest, InverseOfBlackWhiteAndGrayIsTheOppositeGray) {
+    EXPECT_EQ(0xFF000000u, Color::white.inverseRGB());
+    EXPECT_EQ(0xFFFFFFFFu, Color::black.inverseRGB());
+    EXPECT_EQ(0xFF808080u, Color::gray.inverseRGB());
+}
+
+TEST(ColorTest, InverseKeepsTheDominantChannelOfPrimaries) {
+    // Packed a, b, g, r from the high byte down.
+    EXPECT_EQ(0xFF9375F4u, Color::red.inverseRGB());
+    EXPECT_EQ(0xFF75F493u, Color::green.inverseRGB());
+    EXPECT_EQ(0xFFF49375u, Color::blue.inverseRGB());
+    EXPECT_EQ(0xFF687DAEu, Color(200, 120, 40, 255).inverseRGB());
+}
+
+TEST(ColorTest, InverseCarriesAlphaOver) {
+    EXPECT_EQ(0x40FFFFFFu, Color(0, 0, 0, 0x40).inverseRGB());
+    EXPECT_EQ(0x00000000u, Color(255, 255, 255, 0).inverseRGB());
+}
+
+TEST(ColorTest, PredefinedColours) {
+    EXPECT_EQ(255, Color::red.r);
+    EXPECT_EQ(0, Color::red.g);
+    EXPECT_EQ(255, Color::blue.b);
+    EXPECT_EQ(127, Color::gray.g);
+    EXPECT_EQ(255, Color::black.a);
+}
