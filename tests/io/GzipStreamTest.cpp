@@ -1,0 +1,161 @@
+#include <zlib.h>
+
+#include "IoTest.h"
+#include "io/ByteArrayInputStream.h"
+#include "io/ByteArrayOutputStream.h"
+#include "io/Exception.h"
+#include "io/zip/GzipInputStream.h"
+#include "io/zip/GzipOutputStream.h"
+
+namespace {
+
+class GzipStreamTest : public IoTest {
+protected:
+    static Bytes gzip(const Bytes& data) {
+        IO::ByteArrayOutputStream out;
+        {
+            IO::Zip::GzipOutputStream zipped(&out);
+            if (!data.empty()) {
+                zipped.write(data.data(), static_cast<int>(data.size()));
+            }
+        }
+        return out.getData();
+    }
+
+    static Bytes gunzip(const Bytes& compressed) {
+        IO::ByteArrayInputStream in(compressed.data(), static_cast<int>(compressed.size()));
+        IO::Zip::GzipInputStream unzipped(&in);
+        return readAll(unzipped);
+    }
+
+    // Independent of our streams: zlib's own one-shot compression with the zlib header.
+    static Bytes zlibCompress(const Bytes& data) {
+        uLongf size = compressBound(data.size());
+        Bytes out(size);
+        compress(out.data(), &size, data.data(), data.size());
+        out.resize(size);
+        return out;
+    }
+};
+
+}  // namespace
+
+TEST_F(GzipStreamTest, WhatIsWrittenReadsBackIdentically) {
+    for (size_t size : {size_t(1), size_t(4095), size_t(4096), size_t(100000)}) {
+        Bytes data = pattern(size, static_cast<unsigned int>(size));
+        EXPECT_EQ(data, gunzip(gzip(data))) << size;
+    }
+}
+
+TEST_F(GzipStreamTest, HighlyCompressedContentGrowsTheOutputAsNeeded) {
+    Bytes data(3000000, 'a');
+    Bytes compressed = gzip(data);
+    EXPECT_LT(compressed.size(), 10000u);
+    EXPECT_EQ(data, gunzip(compressed));
+}
+
+TEST_F(GzipStreamTest, OutputIsAGzipStreamThatZlibReads) {
+    Bytes data = pattern(20000);
+    Bytes compressed = gzip(data);
+    ASSERT_GE(compressed.size(), 18u);
+    EXPECT_EQ(0x1f, compressed[0]);
+    EXPECT_EQ(0x8b, compressed[1]);
+
+    z_stream zs = {};
+    ASSERT_EQ(Z_OK, inflateInit2(&zs, 31));
+    Bytes out(data.size() + 1);
+    zs.next_in = compressed.data();
+    zs.avail_in = static_cast<uInt>(compressed.size());
+    zs.next_out = out.data();
+    zs.avail_out = static_cast<uInt>(out.size());
+    EXPECT_EQ(Z_STREAM_END, inflate(&zs, Z_FINISH));
+    out.resize(zs.total_out);
+    inflateEnd(&zs);
+    EXPECT_EQ(data, out);
+}
+
+TEST_F(GzipStreamTest, NothingReachesTheOutputBeforeTheStreamIsDestroyed) {
+    IO::ByteArrayOutputStream out;
+    {
+        IO::Zip::GzipOutputStream zipped(&out);
+        EXPECT_EQ(5, zipped.write("hello", 5));
+        EXPECT_TRUE(out.getData().empty());
+    }
+    EXPECT_EQ(bytesOf("hello"), gunzip(out.getData()));
+}
+
+TEST_F(GzipStreamTest, AnEmptyContentMakesAValidGzipStream) {
+    Bytes compressed = gzip(Bytes());
+    EXPECT_GE(compressed.size(), 18u);
+    IO::ByteArrayInputStream in(compressed.data(), static_cast<int>(compressed.size()));
+    IO::Zip::GzipInputStream unzipped(&in);
+    EXPECT_EQ(0, unzipped.available());
+    EXPECT_EQ(0, unzipped.tell());
+}
+
+TEST_F(GzipStreamTest, ZlibWrappedInputIsInflatedToo) {
+    Bytes data = pattern(5000);
+    EXPECT_EQ(data, gunzip(zlibCompress(data)));
+}
+
+TEST_F(GzipStreamTest, PlainBytesPassThroughUnchanged) {
+    Bytes plain = bytesOf("<xml>not compressed</xml>");
+    EXPECT_EQ(plain, gunzip(plain));
+    EXPECT_TRUE(logLines().empty());
+}
+
+TEST_F(GzipStreamTest, EmptyInputLogsTheBufferErrorAndHasNoContent) {
+    IO::ByteArrayInputStream in(nullptr, 0);
+    IO::Zip::GzipInputStream unzipped(&in);
+    EXPECT_TRUE(hasLogLine("GzipInputStream::read error -5"));
+    EXPECT_EQ(0, unzipped.available());
+    EXPECT_EQ(-1, unzipped.tell());
+    unsigned char byte;
+    EXPECT_EQ(-1, unzipped.read(&byte, 1));
+    unzipped.seek(0, KD_SEEK_SET);
+    std::string text = "kept";
+    EXPECT_FALSE(unzipped.readString(text));
+    EXPECT_EQ("kept", text);
+}
+
+TEST_F(GzipStreamTest, ATruncatedStreamIsEmptyAtEveryCut) {
+    Bytes compressed = gzip(pattern(3000));
+    for (size_t cut = 1; cut < compressed.size(); cut += 7) {
+        Bytes truncated(compressed.begin(), compressed.begin() + cut);
+        IO::ByteArrayInputStream in(truncated.data(), static_cast<int>(truncated.size()));
+        IO::Zip::GzipInputStream unzipped(&in);
+        EXPECT_EQ(0, unzipped.available()) << cut;
+    }
+    EXPECT_GT(countLogLines("GzipInputStream::read error -5"), 0);
+}
+
+TEST_F(GzipStreamTest, ACorruptStreamIsEmptyOrPassedThroughButNeverGarbled) {
+    Bytes data = pattern(3000);
+    Bytes compressed = gzip(data);
+    for (size_t at = 0; at < compressed.size(); at += 5) {
+        Bytes corrupt = compressed;
+        corrupt[at] ^= 0x5A;
+        Bytes result = gunzip(corrupt);
+        EXPECT_TRUE(result.empty() || result == corrupt || result == data) << at;
+    }
+}
+
+TEST_F(GzipStreamTest, ExceptionsReachTheInflatedContent) {
+    Bytes compressed = gzip(bytesOf("ab"));
+    IO::ByteArrayInputStream in(compressed.data(), static_cast<int>(compressed.size()));
+    IO::Zip::GzipInputStream unzipped(&in);
+    unzipped.enableExceptions();
+    EXPECT_EQ('a', unzipped.readUByte());
+    EXPECT_THROW(unzipped.readInt(), IO::Exception);
+}
+
+TEST_F(GzipStreamTest, ReadsOnlyWhatTheCompressedStreamHasLeft) {
+    Bytes compressed = gzip(bytesOf("tail"));
+    Bytes framed = bytesOf("head");
+    framed.insert(framed.end(), compressed.begin(), compressed.end());
+    IO::ByteArrayInputStream in(framed.data(), static_cast<int>(framed.size()));
+    in.seek(4, KD_SEEK_SET);
+    IO::Zip::GzipInputStream unzipped(&in);
+    EXPECT_EQ(bytesOf("tail"), readAll(unzipped));
+    EXPECT_EQ(0, in.available());
+}
