@@ -22,11 +22,3 @@ TEST(ColorTest, InverseCarriesAlphaOver) {
     EXPECT_EQ(0x40FFFFFFu, Color(0, 0, 0, 0x40).inverseRGB());
     EXPECT_EQ(0x00000000u, Color(255, 255, 255, 0).inverseRGB());
 }
-
-TEST(ColorTest, PredefinedColours) {
-    EXPECT_EQ(255, Color::red.r);
-    EXPECT_EQ(0, Color::red.g);
-    EXPECT_EQ(255, Color::blue.b);
-    EXPECT_EQ(127, Color::gray.g);
-    EXPECT_EQ(255, Color::black.a);
-}
