@@ -81,6 +81,10 @@ int pack(const std::string& folder, const std::string& package, const Options& o
     int added = builder.addDirectory(folder.c_str(), options.compressed, options.storedSuffixes);
     if (added < 0) {
         std::fprintf(stderr, "mapcore-pak: packing %s failed\n", options.folder.c_str());
+    } else if (added == 0) {
+        // A zip archive without entries cannot be opened again.
+        std::fprintf(stderr, "mapcore-pak: %s holds no files\n", options.folder.c_str());
+        return -1;
     }
     return added;
 }

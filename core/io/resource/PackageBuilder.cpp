@@ -11,6 +11,8 @@ namespace Resource {
 
 namespace {
 
+const size_t kMaxEntryName = 255;
+
 void appendLittleEndian32(std::vector<unsigned char>& bytes, unsigned int value) {
     for (int i = 0; i < 4; ++i) {
         bytes.push_back(static_cast<unsigned char>(value >> (8 * i)));
@@ -50,6 +52,11 @@ bool PackageBuilder::claimNames(const std::string& name, unsigned int blockCount
     std::vector<std::string> names;
     for (unsigned int i = 0; i < blockCount; ++i) {
         names.push_back(partName(name, i));
+        // Readers cannot locate a compressed entry by a longer name.
+        if (names.back().size() > kMaxEntryName) {
+            Logger::log(Logger::Error, "PackageBuilder: entry name %s is too long", names.back().c_str());
+            return false;
+        }
         if (entryNames.count(names.back())) {
             Logger::log(Logger::Error, "PackageBuilder: entry %s is already in the package",
                         names.back().c_str());

@@ -26,8 +26,9 @@ public:
     // Finishes the package if finish() was not called.
     ~PackageBuilder();
 
-    // Adds a resource. False, with nothing added, when the name is empty or already used by a
-    // resource or a part, or the data is larger than 4 GiB - 1.
+    // Adds a resource. False, with nothing added, when the name is empty, already used by a
+    // resource or a part, or (with its part suffix) longer than 255 bytes, or the data is larger
+    // than 4 GiB - 1.
     bool addResource(const std::string& name, const void* data, size_t size, bool compressed);
     // Adds everything data has left; false, with nothing added, when it cannot all be read.
     bool addResource(const std::string& name, InputStream& data, bool compressed);

@@ -1,0 +1,329 @@
+#include <boost/make_shared.hpp>
+
+#include "IoTest.h"
+#include "io/ByteArrayInputStream.h"
+#include "io/ByteArrayOutputStream.h"
+#include "io/resource/BlockInputStream.h"
+#include "io/resource/PackageBuilder.h"
+#include "io/resource/ResBlockInputStream.h"
+#include "io/resource/ResourceFile.h"
+#include "io/zip/ZipOutputStream.h"
+
+namespace {
+
+using IO::Resource::BlockInputStream;
+using IO::Resource::PackageBuilder;
+using IO::Resource::ResourceFile;
+
+// Serves blocks of a byte vector from memory and records which it was asked for.
+class BlockSource {
+public:
+    BlockSource(const std::vector<unsigned char>& data, unsigned int blockSize)
+        : data(data), blockSize(blockSize) {}
+
+    boost::shared_ptr<IO::InputStream> open(unsigned int index) {
+        opened.push_back(index);
+        size_t begin = static_cast<size_t>(index) * blockSize;
+        if (begin >= data.size() || missing == static_cast<int>(index)) {
+            return boost::shared_ptr<IO::InputStream>();
+        }
+        size_t size = std::min<size_t>(blockSize + extraBytes, data.size() - begin);
+        return boost::make_shared<IO::ByteArrayInputStream>(data.data() + begin, static_cast<int>(size));
+    }
+
+    BlockInputStream::BlockOpener opener() {
+        return BlockInputStream::BlockOpener::make<BlockSource, &BlockSource::open>(this);
+    }
+
+    std::vector<unsigned int> opened;
+    int missing = -1;
+    // Serves blocks longer than the block size, as a damaged package could.
+    unsigned int extraBytes = 0;
+
+private:
+    const std::vector<unsigned char>& data;
+    unsigned int blockSize;
+};
+
+class ResourceFileTest : public IoTest {
+protected:
+    // A package in memory made by the builder.
+    boost::shared_ptr<IO::ByteArrayOutputStream> package = boost::make_shared<IO::ByteArrayOutputStream>();
+
+    boost::shared_ptr<IO::InputStream> packageStream() {
+        return boost::make_shared<IO::ByteArrayInputStream>(package->getData().data(),
+                                                            static_cast<int>(package->getData().size()));
+    }
+
+    boost::shared_ptr<IO::InputStream> openResource(const std::string& name,
+                                                    boost::shared_ptr<IO::Resource::FileSystem> index) {
+        boost::shared_ptr<ResourceFile> resource = boost::make_shared<ResourceFile>(packageStream());
+        return resource->openInputStream(name, index);
+    }
+
+    Bytes thousand = pattern(1000, 7);
+};
+
+}  // namespace
+
+TEST_F(ResourceFileTest, ABlockStreamOpensEveryBlockItReadsInOrder) {
+    BlockSource source(thousand, 400);
+    BlockInputStream stream(source.opener(), 1000, 400);
+    Bytes all(1000);
+    EXPECT_EQ(1000, stream.read(all.data(), 1000));
+    EXPECT_EQ(thousand, all);
+    EXPECT_EQ((std::vector<unsigned int>{0, 1, 2}), source.opened);
+    EXPECT_EQ(0, stream.available());
+}
+
+TEST_F(ResourceFileTest, ASeekOpensNothingAndAReadOpensOnlyTheBlocksItTouches) {
+    BlockSource source(thousand, 400);
+    BlockInputStream stream(source.opener(), 1000, 400);
+    stream.seek(850, KD_SEEK_SET);
+    EXPECT_TRUE(source.opened.empty());
+    Bytes tail(150);
+    EXPECT_EQ(150, stream.read(tail.data(), 150));
+    EXPECT_EQ(Bytes(thousand.begin() + 850, thousand.end()), tail);
+    EXPECT_EQ((std::vector<unsigned int>{2}), source.opened);
+
+    stream.seek(-700, KD_SEEK_CUR);
+    Bytes across(100);
+    EXPECT_EQ(100, stream.read(across.data(), 100));
+    EXPECT_EQ(Bytes(thousand.begin() + 300, thousand.begin() + 400), across);
+    stream.seek(350, KD_SEEK_SET);
+    EXPECT_EQ(100, stream.read(across.data(), 100));
+    EXPECT_EQ(Bytes(thousand.begin() + 350, thousand.begin() + 450), across);
+    EXPECT_EQ((std::vector<unsigned int>{2, 0, 1}), source.opened);
+}
+
+TEST_F(ResourceFileTest, ReadingPastTheEndReturnsShortWithoutTouchingAFurtherBlock) {
+    BlockSource source(thousand, 400);
+    BlockInputStream stream(source.opener(), 1000, 400);
+    stream.seek(-10, KD_SEEK_END);
+    Bytes buffer(50);
+    EXPECT_EQ(10, stream.read(buffer.data(), 50));
+    EXPECT_EQ(Bytes(thousand.end() - 10, thousand.end()), Bytes(buffer.begin(), buffer.begin() + 10));
+    EXPECT_EQ(0, stream.read(buffer.data(), 50));
+    EXPECT_EQ((std::vector<unsigned int>{2}), source.opened);
+}
+
+TEST_F(ResourceFileTest, SeekingABlockStreamIsClampedToTheResource) {
+    BlockSource source(thousand, 400);
+    BlockInputStream stream(source.opener(), 1000, 400);
+    stream.seek(-5, KD_SEEK_SET);
+    EXPECT_EQ(0, stream.tell());
+    stream.seek(5000, KD_SEEK_CUR);
+    EXPECT_EQ(1000, stream.tell());
+    EXPECT_EQ(0, stream.available());
+}
+
+TEST_F(ResourceFileTest, AMissingBlockEndsTheReadShort) {
+    BlockSource source(thousand, 400);
+    source.missing = 1;
+    BlockInputStream stream(source.opener(), 1000, 400);
+    Bytes all(1000);
+    EXPECT_EQ(400, stream.read(all.data(), 1000));
+    EXPECT_EQ(400, stream.tell());
+}
+
+TEST_F(ResourceFileTest, ABlockLongerThanTheBlockSizeDoesNotLendItsBytesToTheNext) {
+    BlockSource source(thousand, 400);
+    source.extraBytes = 50;
+    BlockInputStream stream(source.opener(), 1000, 400);
+    Bytes all(1000);
+    EXPECT_EQ(1000, stream.read(all.data(), 1000));
+    EXPECT_EQ(thousand, all);
+}
+
+TEST_F(ResourceFileTest, ASplitResourceReadsBackThroughItsParts) {
+    {
+        PackageBuilder builder(package, 400);
+        EXPECT_TRUE(builder.addResource("X", thousand.data(), thousand.size(), true));
+    }
+    boost::shared_ptr<IO::Resource::FileSystem> index = ResourceFile::createFileSystem(packageStream());
+    ASSERT_TRUE(index);
+    boost::shared_ptr<IO::InputStream> stream = openResource("X", index);
+    ASSERT_TRUE(dynamic_cast<IO::Resource::ResBlockInputStream*>(stream.get()));
+    EXPECT_EQ(1000, stream->available());
+    stream->seek(850, KD_SEEK_SET);
+    Bytes tail(150);
+    EXPECT_EQ(150, stream->read(tail.data(), 150));
+    EXPECT_EQ(Bytes(thousand.begin() + 850, thousand.end()), tail);
+    stream->seek(0, KD_SEEK_SET);
+    EXPECT_EQ(thousand, readAll(*stream));
+}
+
+TEST_F(ResourceFileTest, StoredPartsShareOnePackageStreamAndStillReadRight) {
+    {
+        PackageBuilder builder(package, 300);
+        EXPECT_TRUE(builder.addResource("X", thousand.data(), thousand.size(), false));
+    }
+    boost::shared_ptr<IO::InputStream> stream =
+        openResource("X", ResourceFile::createFileSystem(packageStream()));
+    ASSERT_TRUE(stream);
+    Bytes buffer(10);
+    for (long long at : {995LL, 5LL, 605LL, 295LL, 0LL}) {
+        stream->seek(at, KD_SEEK_SET);
+        int count = stream->read(buffer.data(), 5);
+        EXPECT_EQ(5, count) << at;
+        EXPECT_EQ(Bytes(thousand.begin() + at, thousand.begin() + at + 5),
+                  Bytes(buffer.begin(), buffer.begin() + 5));
+    }
+}
+
+TEST_F(ResourceFileTest, AResourceNoLargerThanItsBlockIsASingleEntry) {
+    Bytes four = pattern(400, 3);
+    {
+        PackageBuilder builder(package, 400);
+        EXPECT_TRUE(builder.addResource("X", four.data(), four.size(), true));
+        EXPECT_TRUE(builder.addResource("plain", thousand.data(), 0, false));
+    }
+    boost::shared_ptr<IO::Resource::FileSystem> index = ResourceFile::createFileSystem(packageStream());
+    boost::shared_ptr<IO::InputStream> stream = openResource("X", index);
+    ASSERT_TRUE(stream);
+    EXPECT_FALSE(dynamic_cast<IO::Resource::ResBlockInputStream*>(stream.get()));
+    EXPECT_EQ(four, readAll(*stream));
+    boost::shared_ptr<IO::InputStream> empty = openResource("plain", index);
+    ASSERT_TRUE(empty);
+    EXPECT_EQ(0, empty->available());
+}
+
+TEST_F(ResourceFileTest, AResourceOpensWithoutAPreparedIndexToo) {
+    {
+        PackageBuilder builder(package, 400);
+        builder.addResource("X", thousand.data(), thousand.size(), true);
+    }
+    boost::shared_ptr<IO::InputStream> stream =
+        openResource("X", boost::shared_ptr<IO::Resource::FileSystem>());
+    ASSERT_TRUE(stream);
+    EXPECT_EQ(thousand, readAll(*stream));
+}
+
+TEST_F(ResourceFileTest, AMissingResourceIsLoggedAndEmpty) {
+    {
+        PackageBuilder builder(package, 0);
+        builder.addResource("X", thousand.data(), thousand.size(), true);
+    }
+    EXPECT_FALSE(openResource("Y", ResourceFile::createFileSystem(packageStream())));
+    EXPECT_TRUE(hasLogLine("File Y not found in resource"));
+}
+
+TEST_F(ResourceFileTest, AStreamKeepsItsPackageAliveAfterEverythingElseIsGone) {
+    {
+        PackageBuilder builder(package, 400);
+        builder.addResource("X", thousand.data(), thousand.size(), false);
+    }
+    boost::shared_ptr<IO::InputStream> stream =
+        openResource("X", ResourceFile::createFileSystem(packageStream()));
+    ASSERT_TRUE(stream);
+    EXPECT_EQ(thousand, readAll(*stream));
+}
+
+TEST_F(ResourceFileTest, AnUnreadablePackageGivesNoIndex) {
+    Bytes garbage = bytesOf("this is not a zip archive at all");
+    boost::shared_ptr<IO::InputStream> stream =
+        boost::make_shared<IO::ByteArrayInputStream>(garbage.data(), static_cast<int>(garbage.size()));
+    EXPECT_FALSE(ResourceFile::createFileSystem(stream));
+    expectAssertion("false");
+}
+
+namespace {
+
+// Packages with hand-made extra fields, which the builder never writes.
+class DamagedPackageTest : public ResourceFileTest {
+protected:
+    void writePackage(const Bytes& extra, bool withLastPart) {
+        IO::Zip::ZipOutputStream zip(package);
+        zip.openEntry("X", true, extra);
+        zip.write(thousand.data(), 400);
+        zip.closeEntry();
+        zip.openEntry("X.part001", false);
+        zip.write(thousand.data() + 400, 400);
+        zip.closeEntry();
+        if (withLastPart) {
+            zip.openEntry("X.part002", true);
+            zip.write(thousand.data() + 800, 200);
+            zip.closeEntry();
+        }
+    }
+};
+
+}  // namespace
+
+TEST_F(DamagedPackageTest, AMissingPartEndsTheResourceShort) {
+    writePackage({0xE8, 0x03, 0, 0, 0x90, 0x01, 0, 0}, false);
+    boost::shared_ptr<IO::InputStream> stream =
+        openResource("X", ResourceFile::createFileSystem(packageStream()));
+    ASSERT_TRUE(stream);
+    Bytes all(1000);
+    EXPECT_EQ(800, stream->read(all.data(), 1000));
+    EXPECT_EQ(Bytes(thousand.begin(), thousand.begin() + 800), Bytes(all.begin(), all.begin() + 800));
+    expectAssertion("entry");
+}
+
+TEST_F(DamagedPackageTest, AnExtraFieldOfTheWrongSizeIsRefused) {
+    writePackage({0xE8, 0x03, 0}, true);
+    EXPECT_FALSE(openResource("X", ResourceFile::createFileSystem(packageStream())));
+    expectAssertion("entry->extra.size() == sizeof(ExtraField)");
+}
+
+TEST_F(DamagedPackageTest, ABlockSizeOfZeroIsRefused) {
+    writePackage({0xE8, 0x03, 0, 0, 0, 0, 0, 0}, true);
+    EXPECT_FALSE(openResource("X", ResourceFile::createFileSystem(packageStream())));
+    expectAssertion("extra.blockSize > 0");
+}
+
+TEST_F(ResourceFileTest, TheBuilderRefusesNamesThatWouldCollide) {
+    PackageBuilder builder(package, 400);
+    EXPECT_TRUE(builder.addResource("a", thousand.data(), 1000, true));
+    EXPECT_FALSE(builder.addResource("a", thousand.data(), 10, true));
+    EXPECT_FALSE(builder.addResource("a.part002", thousand.data(), 10, true));
+    EXPECT_TRUE(builder.addResource("b.part001", thousand.data(), 10, true));
+    EXPECT_FALSE(builder.addResource("b", thousand.data(), 1000, true));
+    EXPECT_FALSE(builder.addResource("", thousand.data(), 10, true));
+    EXPECT_TRUE(builder.addResource(std::string(255, 'n'), thousand.data(), 10, true));
+    EXPECT_FALSE(builder.addResource(std::string(250, 'm'), thousand.data(), 1000, true));
+    EXPECT_EQ(5, countLogLines("PackageBuilder:"));
+}
+
+TEST_F(ResourceFileTest, TheBuilderPacksAFolderThatReadsBackByteForByte) {
+    Bytes big = pattern(5000, 11);
+    Bytes small = bytesOf("small text");
+    Bytes image = pattern(700, 12);
+    writeFile("/data/in/big.bin", big);
+    writeFile("/data/in/sub/small.txt", small);
+    writeFile("/data/in/sub/deeper/image.png", image);
+    writeFile("/data/in/empty", Bytes());
+    {
+        PackageBuilder builder(package, 1024);
+        EXPECT_EQ(4, builder.addDirectory("/data/in/", true, {".png"}));
+    }
+    boost::shared_ptr<IO::Resource::FileSystem> index = ResourceFile::createFileSystem(packageStream());
+    ASSERT_TRUE(index);
+    for (auto expected : {std::make_pair("big.bin", big), std::make_pair("sub/small.txt", small),
+                          std::make_pair("sub/deeper/image.png", image), std::make_pair("empty", Bytes())}) {
+        boost::shared_ptr<IO::InputStream> stream = openResource(expected.first, index);
+        ASSERT_TRUE(stream) << expected.first;
+        EXPECT_EQ(expected.second, readAll(*stream)) << expected.first;
+    }
+    boost::shared_ptr<IO::Zip::ZipFile> zip = boost::make_shared<IO::Zip::ZipFile>();
+    ASSERT_TRUE(zip->init(packageStream(), nullptr));
+    EXPECT_FALSE(zip->findEntry("sub/deeper/image.png")->compressed);
+    EXPECT_TRUE(zip->findEntry("sub/small.txt")->compressed);
+    EXPECT_TRUE(zip->findEntry("big.bin.part004"));
+    EXPECT_EQ((Bytes{0x88, 0x13, 0, 0, 0, 4, 0, 0}), zip->findEntry("big.bin")->extra);
+}
+
+TEST_F(ResourceFileTest, TheSameFolderAlwaysGivesTheSamePackage) {
+    writeFile("/data/in/b", pattern(100, 1));
+    writeFile("/data/in/a", pattern(100, 2));
+    writeFile("/data/in/c/d", pattern(100, 3));
+    boost::shared_ptr<IO::ByteArrayOutputStream> second = boost::make_shared<IO::ByteArrayOutputStream>();
+    {
+        PackageBuilder first(package, 0);
+        first.addDirectory("/data/in", true, {});
+        PackageBuilder again(second, 0);
+        again.addDirectory("/data/in", true, {});
+    }
+    EXPECT_EQ(package->getData(), second->getData());
+}
