@@ -6,6 +6,7 @@
 #include <pal/Simulation.h>
 
 #include <mutex>
+#include <string>
 #include <unordered_map>
 #include <unordered_set>
 
@@ -38,25 +39,19 @@ GraphicsState gState;
 // reclaims it.
 pal::detail::GraphicsEglContext& gContext = *new pal::detail::GraphicsEglContext();
 
-void logFailureOnceLocked() {
-    if (gState.failureLogged) {
-        return;
-    }
-    gState.failureLogged = true;
-    std::string line =
-        "pal: no OpenGL ES context, redraw handlers will not be called: " + gContext.failedReason();
-    pal::detail::writeLogLine(line.c_str());
-}
-
-// Makes the context current for a redraw; false (logged) when that is impossible.
+// Makes the context current for a redraw. A failure is logged once (until the
+// next reset), since redraws come sixty times a second.
 bool prepareContextLocked() {
     if (gContext.makeCurrent(gState.width, gState.height)) {
         return true;
     }
-    if (!gContext.failedReason().empty()) {
-        logFailureOnceLocked();
-    } else {
-        pal::detail::writeLogLine("pal: redraw skipped: the graphics context is current on another thread");
+    if (!gState.failureLogged) {
+        gState.failureLogged = true;
+        const std::string reason = gContext.failedReason().empty()
+                                       ? "the context is current on another thread"
+                                       : gContext.failedReason();
+        const std::string line = "pal: graphics unavailable, redraw handlers are not called: " + reason;
+        pal::detail::writeLogLine(line.c_str());
     }
     return false;
 }

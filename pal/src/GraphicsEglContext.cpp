@@ -7,10 +7,12 @@
 namespace pal::detail {
 
 bool GraphicsEglContext::makeCurrent(int width, int height) {
-    if (!failedReason_.empty()) {
+    if (initializationFailed_) {
         return false;
     }
+    failedReason_.clear();
     if (context_ == EGL_NO_CONTEXT && !initialize()) {
+        initializationFailed_ = true;
         return false;
     }
     if ((surface_ == EGL_NO_SURFACE || width != width_ || height != height_) &&
@@ -37,39 +39,18 @@ void GraphicsEglContext::release() {
         if (context_ != EGL_NO_CONTEXT) {
             eglDestroyContext(display_, context_);
         }
-        eglTerminate(display_);
     }
-    display_ = EGL_NO_DISPLAY;
-    config_ = nullptr;
     context_ = EGL_NO_CONTEXT;
     surface_ = EGL_NO_SURFACE;
     width_ = 0;
     height_ = 0;
     failedReason_.clear();
+    initializationFailed_ = false;
 }
 
 bool GraphicsEglContext::initialize() {
-    // The surfaceless platform renders off-screen (llvmpipe on a machine
-    // without a GPU), so no EGL_PLATFORM setting or display server is needed.
-    display_ = eglGetPlatformDisplay(EGL_PLATFORM_SURFACELESS_MESA, EGL_DEFAULT_DISPLAY, nullptr);
-    if (display_ == EGL_NO_DISPLAY) {
-        return fail("eglGetPlatformDisplay(EGL_PLATFORM_SURFACELESS_MESA)");
-    }
-    if (!eglInitialize(display_, nullptr, nullptr)) {
-        display_ = EGL_NO_DISPLAY;
-        return fail("eglInitialize");
-    }
-    // clang-format off
-    const EGLint configAttributes[] = {
-        EGL_RENDERABLE_TYPE, EGL_OPENGL_ES_BIT,
-        EGL_SURFACE_TYPE, EGL_PBUFFER_BIT,
-        EGL_RED_SIZE, 8, EGL_GREEN_SIZE, 8, EGL_BLUE_SIZE, 8, EGL_ALPHA_SIZE, 8,
-        EGL_DEPTH_SIZE, 16,
-        EGL_NONE};
-    // clang-format on
-    EGLint count = 0;
-    if (!eglChooseConfig(display_, configAttributes, &config_, 1, &count) || count < 1) {
-        return fail("eglChooseConfig (RGBA8, depth 16, pbuffer, OpenGL ES)");
+    if (display_ == EGL_NO_DISPLAY && !initializeDisplay()) {
+        return false;
     }
     if (!eglBindAPI(EGL_OPENGL_ES_API)) {
         return fail("eglBindAPI(EGL_OPENGL_ES_API)");
@@ -82,7 +63,44 @@ bool GraphicsEglContext::initialize() {
     return true;
 }
 
+bool GraphicsEglContext::initializeDisplay() {
+    // The surfaceless platform renders off-screen (llvmpipe on a machine
+    // without a GPU), so no EGL_PLATFORM setting or display server is needed.
+    EGLDisplay display = eglGetPlatformDisplay(EGL_PLATFORM_SURFACELESS_MESA, EGL_DEFAULT_DISPLAY, nullptr);
+    if (display == EGL_NO_DISPLAY) {
+        return fail("eglGetPlatformDisplay(EGL_PLATFORM_SURFACELESS_MESA)");
+    }
+    if (!eglInitialize(display, nullptr, nullptr)) {
+        return fail("eglInitialize");
+    }
+    // clang-format off
+    const EGLint configAttributes[] = {
+        EGL_RENDERABLE_TYPE, EGL_OPENGL_ES_BIT,
+        EGL_SURFACE_TYPE, EGL_PBUFFER_BIT,
+        EGL_RED_SIZE, 8, EGL_GREEN_SIZE, 8, EGL_BLUE_SIZE, 8, EGL_ALPHA_SIZE, 8,
+        EGL_DEPTH_SIZE, 16,
+        EGL_NONE};
+    // clang-format on
+    EGLint count = 0;
+    if (!eglChooseConfig(display, configAttributes, &config_, 1, &count) || count < 1) {
+        return fail("eglChooseConfig (RGBA8, depth 16, pbuffer, OpenGL ES)");
+    }
+    eglGetConfigAttrib(display, config_, EGL_MAX_PBUFFER_WIDTH, &maxWidth_);
+    eglGetConfigAttrib(display, config_, EGL_MAX_PBUFFER_HEIGHT, &maxHeight_);
+    display_ = display;
+    return true;
+}
+
 bool GraphicsEglContext::createSurface(int width, int height) {
+    // Mesa creates larger pbuffers without complaint but then cannot render
+    // into them, so the advertised limit is enforced here.
+    if (width > maxWidth_ || height > maxHeight_) {
+        char reason[160];
+        std::snprintf(reason, sizeof(reason), "context size %dx%d exceeds the largest pbuffer (%dx%d)", width,
+                      height, maxWidth_, maxHeight_);
+        failedReason_ = reason;
+        return false;
+    }
     const EGLint attributes[] = {EGL_WIDTH, width, EGL_HEIGHT, height, EGL_NONE};
     EGLSurface surface = eglCreatePbufferSurface(display_, config_, attributes);
     if (surface == EGL_NO_SURFACE) {

@@ -18,8 +18,9 @@ public:
 
     // Creates the context on first use and the pbuffer at the given size
     // (again when the size changed), then makes both current on the calling
-    // thread. False when EGL failed; failedReason() says why, and no further
-    // attempt is made until release().
+    // thread. False when EGL failed, and failedReason() says why; after a
+    // failed initialisation no further attempt is made until release().
+    // False with an empty reason when the context is current on another thread.
     bool makeCurrent(int width, int height);
     // Makes the existing context current without resizing; false without one.
     bool makeCurrentAsIs();
@@ -27,11 +28,14 @@ public:
     int width() const { return width_; }
     int height() const { return height_; }
     const std::string& failedReason() const { return failedReason_; }
-    // Destroys everything, so the next makeCurrent starts afresh.
+    // Destroys the context and the pbuffer, so the next makeCurrent starts
+    // afresh. The display stays initialised for the life of the process:
+    // terminating it makes Mesa unload its driver, which leaks each time.
     void release();
 
 private:
     bool initialize();
+    bool initializeDisplay();
     bool createSurface(int width, int height);
     bool bind();
     bool fail(const char* call);
@@ -40,9 +44,12 @@ private:
     EGLConfig config_ = nullptr;
     EGLContext context_ = EGL_NO_CONTEXT;
     EGLSurface surface_ = EGL_NO_SURFACE;
+    EGLint maxWidth_ = 0;
+    EGLint maxHeight_ = 0;
     int width_ = 0;
     int height_ = 0;
     std::string failedReason_;
+    bool initializationFailed_ = false;
 };
 
 }  // namespace pal::detail

@@ -173,4 +173,25 @@ TEST_F(GraphicsTest, EachViewGetsItsOwnHandlerAndRemovedHandlersAreNotCalled) {
     EXPECT_EQ(pal::redrawCount(), 2);
 }
 
+TEST_F(GraphicsTest, AnImpossibleSizeSkipsTheRedrawWithOneLogLineAndAGoodSizeRecovers) {
+    kdGFXSetRedrawHandler(&gViewA, drawA);
+    pal::setContextSize(1 << 20, 1 << 20);
+    for (int i = 0; i < 3; ++i) {
+        kdGFXRequestRedraw(&gViewA);
+        kdPumpEvents();
+    }
+    EXPECT_EQ(gCallsA, 0);
+    int lines = 0;
+    for (const std::string& line : log) {
+        lines += line.find("graphics unavailable") != std::string::npos ? 1 : 0;
+    }
+    EXPECT_EQ(lines, 1);
+
+    pal::setContextSize(4, 4);
+    kdGFXRequestRedraw(&gViewA);
+    kdPumpEvents();
+    EXPECT_EQ(gCallsA, 1);
+    expectFrame(4, 4, gClearColour);
+}
+
 }  // namespace
