@@ -1,0 +1,275 @@
+// The redraw loop on the virtual clock: the 60 Hz timer fires at exact
+// multiples of 16,666,666 ns from the moment it starts.
+#include <KD/kdext.h>
+#include <pal/Simulation.h>
+
+#include <boost/scoped_ptr.hpp>
+#include <vector>
+
+#include "redraw/UpdateGenerator.h"
+#include "redraw/ViewRedrawManager.h"
+#include "redraw/ViewRedrawManagerDelegate.h"
+#include "support/PalTest.h"
+
+namespace {
+
+const KDust kTick = 16666666;
+const KDust kSecond = 1000000000ull;
+
+class RecordingDelegate : public Redraw::ViewRedrawManagerDelegate {
+public:
+    void update(int elapsedMs) override {
+        updates.push_back(elapsedMs);
+        if (redrawOnUpdate) {
+            manager->scheduleRedraw();
+        }
+    }
+    void redraw() override { ++redraws; }
+
+    Redraw::ViewRedrawManager* manager = nullptr;
+    bool redrawOnUpdate = false;
+    std::vector<int> updates;
+    int redraws = 0;
+};
+
+class ViewRedrawManagerTest : public PalTest {
+protected:
+    void SetUp() override {
+        PalTest::SetUp();
+        manager.reset(new Redraw::ViewRedrawManager(delegate));
+        delegate.manager = manager.get();
+    }
+
+    void TearDown() override {
+        manager.reset();
+        PalTest::TearDown();
+    }
+
+    // Resumes through the platform's view event and lets the first,
+    // empty tick stop the timer.
+    void resumeAndSettle() {
+        pal::postViewResumed();
+        pump();
+        advance(kTick);
+        ASSERT_FALSE(manager->getIsTimerStarted());
+        delegate.updates.clear();
+        delegate.redraws = 0;
+    }
+
+    RecordingDelegate delegate;
+    boost::scoped_ptr<Redraw::ViewRedrawManager> manager;
+};
+
+TEST_F(ViewRedrawManagerTest, IdleManagerRunsNoTimerAndCostsNoWakeUps) {
+    resumeAndSettle();
+    std::uint64_t firesBefore = pal::timerFireCount();
+
+    advance(10 * 60 * kSecond);
+
+    EXPECT_EQ(pal::timerFireCount(), firesBefore);
+    EXPECT_EQ(pal::activeTimerCount(), 0);
+    EXPECT_TRUE(delegate.updates.empty());
+    EXPECT_EQ(delegate.redraws, 0);
+}
+
+TEST_F(ViewRedrawManagerTest, ScheduledRedrawRunsOnceAndTheTimerStopsAtThatTick) {
+    resumeAndSettle();
+
+    manager->scheduleRedraw();
+    EXPECT_TRUE(manager->getIsTimerStarted());
+    advance(kTick);
+
+    EXPECT_EQ(delegate.redraws, 1);
+    EXPECT_TRUE(delegate.updates.empty());
+    EXPECT_FALSE(manager->getIsTimerStarted());
+    std::uint64_t firesAfter = pal::timerFireCount();
+    advance(60 * kSecond);
+    EXPECT_EQ(delegate.redraws, 1);
+    EXPECT_EQ(pal::timerFireCount(), firesAfter);
+}
+
+TEST_F(ViewRedrawManagerTest, ScheduledUpdateAfterIdleSpellIsOneTickLong) {
+    resumeAndSettle();
+    advance(60 * kSecond);
+    manager->onUserActivity();
+
+    manager->scheduleUpdate();
+    manager->scheduleUpdate();
+    advance(3 * kTick);
+
+    EXPECT_EQ(delegate.updates, (std::vector<int>{16}));
+    EXPECT_FALSE(manager->getIsTimerStarted());
+}
+
+TEST_F(ViewRedrawManagerTest, GeneratorUpdatesEveryTickAndTimerStopsAfterItGoes) {
+    resumeAndSettle();
+    {
+        Redraw::UpdateGenerator generator(*manager);
+        advance(6 * kTick);
+        EXPECT_EQ(delegate.updates, (std::vector<int>(6, 16)));
+        EXPECT_TRUE(manager->getIsTimerStarted());
+    }
+    advance(kTick);
+
+    EXPECT_EQ(delegate.updates.size(), 6u);
+    EXPECT_FALSE(manager->getIsTimerStarted());
+}
+
+TEST_F(ViewRedrawManagerTest, NestedGeneratorsKeepUpdatingUntilTheLastOneGoes) {
+    resumeAndSettle();
+    boost::scoped_ptr<Redraw::UpdateGenerator> outer(new Redraw::UpdateGenerator(*manager));
+    boost::scoped_ptr<Redraw::UpdateGenerator> inner(new Redraw::UpdateGenerator(*manager));
+
+    outer.reset();
+    advance(2 * kTick);
+    EXPECT_EQ(delegate.updates.size(), 2u);
+
+    inner.reset();
+    advance(2 * kTick);
+    EXPECT_EQ(delegate.updates.size(), 2u);
+    EXPECT_FALSE(manager->getIsTimerStarted());
+}
+
+TEST_F(ViewRedrawManagerTest, GeneratorJoiningScheduledUpdateCountsOnce) {
+    resumeAndSettle();
+    manager->scheduleUpdate();
+    {
+        Redraw::UpdateGenerator generator(*manager);
+        advance(2 * kTick);
+    }
+    advance(2 * kTick);
+
+    EXPECT_EQ(delegate.updates.size(), 2u);
+    EXPECT_FALSE(manager->getIsTimerStarted());
+}
+
+TEST_F(ViewRedrawManagerTest, ThrottlesTo40msAfter10sWithoutUserInputWhileViewIsActive) {
+    resumeAndSettle();
+    advance(12 * kSecond);
+    manager->onViewActivity();
+    EXPECT_EQ(manager->getMinUpdatePeriod(), 40000000);
+
+    Redraw::UpdateGenerator generator(*manager);
+    advance(30 * kTick);
+
+    // Every third tick is more than 40 ms after the last accepted one.
+    EXPECT_EQ(delegate.updates, (std::vector<int>(10, 49)));
+}
+
+TEST_F(ViewRedrawManagerTest, ThrottlesTo100msAfter5sWithoutViewActivity) {
+    resumeAndSettle();
+    advance(12 * kSecond);
+    EXPECT_EQ(manager->getMinUpdatePeriod(), 100000000);
+
+    Redraw::UpdateGenerator generator(*manager);
+    advance(42 * kTick);
+
+    EXPECT_EQ(delegate.updates, (std::vector<int>(6, 116)));
+}
+
+TEST_F(ViewRedrawManagerTest, UserInputLiftsTheThrottleAtOnce) {
+    resumeAndSettle();
+    advance(12 * kSecond);
+    Redraw::UpdateGenerator generator(*manager);
+    advance(7 * kTick);
+    ASSERT_EQ(delegate.updates.size(), 1u);
+
+    manager->onUserActivity();
+    EXPECT_EQ(manager->getMinUpdatePeriod(), 0);
+    advance(3 * kTick);
+
+    EXPECT_EQ(delegate.updates, (std::vector<int>{116, 16, 16, 16}));
+}
+
+TEST_F(ViewRedrawManagerTest, ElapsedTimeIsClampedTo5And200ms) {
+    resumeAndSettle();
+    Redraw::UpdateGenerator generator(*manager);
+    advance(2000000);
+    manager->tick();
+    EXPECT_EQ(delegate.updates, (std::vector<int>{5}));
+
+    // A main thread stalled for half a second: the paused view's timer
+    // does not run, and the late tick sees the whole gap.
+    pal::postViewPaused();
+    pump();
+    advance(500000000);
+    manager->tick();
+
+    EXPECT_EQ(delegate.updates, (std::vector<int>{5, 200}));
+}
+
+TEST_F(ViewRedrawManagerTest, CountsFramesAndUpdatesOfTheFirstFullSecond) {
+    delegate.redrawOnUpdate = true;
+    pal::postViewResumed();
+    pump();
+    Redraw::UpdateGenerator generator(*manager);
+
+    advance(60 * kTick);
+    EXPECT_EQ(manager->getFPS(), 0);
+    EXPECT_EQ(manager->getUPS(), 0);
+
+    advance(kTick);
+    EXPECT_EQ(manager->getFPS(), 60);
+    EXPECT_EQ(manager->getUPS(), 60);
+}
+
+TEST_F(ViewRedrawManagerTest, PauseStopsTheTimerAndResumeRestartsIt) {
+    resumeAndSettle();
+    Redraw::UpdateGenerator generator(*manager);
+    advance(kTick);
+
+    pal::postViewPaused();
+    pump();
+    EXPECT_FALSE(manager->getIsTimerStarted());
+    advance(kSecond);
+    EXPECT_EQ(delegate.updates.size(), 1u);
+
+    pal::postViewResumed();
+    pump();
+    advance(kTick);
+    EXPECT_EQ(delegate.updates, (std::vector<int>{16, 16}));
+}
+
+TEST_F(ViewRedrawManagerTest, PausedTwiceOrResumedTwiceChangesNothing) {
+    EXPECT_FALSE(manager->onViewPaused());
+    EXPECT_TRUE(manager->onViewResumed());
+    EXPECT_FALSE(manager->onViewResumed());
+    EXPECT_TRUE(manager->onViewPaused());
+}
+
+TEST_F(ViewRedrawManagerTest, SchedulingOffTheMainThreadIsReportedAndRefused) {
+    resumeAndSettle();
+    struct Worker {
+        static void* run(void* argument) {
+            Redraw::ViewRedrawManager* target = static_cast<Redraw::ViewRedrawManager*>(argument);
+            target->scheduleRedraw();
+            target->scheduleUpdate();
+            return nullptr;
+        }
+    };
+    KDThread* worker = kdThreadCreate(nullptr, &Worker::run, manager.get());
+    ASSERT_NE(worker, nullptr);
+    kdThreadJoin(worker, nullptr);
+
+    expectAssertion("kdThreadIsMainZVR()");
+    expectAssertion("kdThreadIsMainZVR()");
+    EXPECT_FALSE(manager->getIsTimerStarted());
+    EXPECT_EQ(pal::activeTimerCount(), 0);
+}
+
+TEST_F(ViewRedrawManagerTest, GeneratorCountBelowZeroIsReportedAndRepaired) {
+    resumeAndSettle();
+
+    manager->decreaseUpdateGeneratorCount();
+    expectAssertion("updateGeneratorCount >= 0");
+
+    {
+        Redraw::UpdateGenerator generator(*manager);
+        advance(kTick);
+    }
+    advance(kTick);
+    EXPECT_EQ(delegate.updates.size(), 1u);
+    EXPECT_FALSE(manager->getIsTimerStarted());
+}
+
+}  // namespace
