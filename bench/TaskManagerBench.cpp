@@ -1,0 +1,143 @@
+// Empty tasks through the task manager: scheduled on the owner thread, run on
+// the worker, onFinished() back on the owner, which pumps platform events;
+// against a bare worker thread fed through a std::mutex +
+// std::condition_variable queue that hands each result back to the owner
+// through a second such queue. Both run the same task objects.
+#include <KD/kd.h>
+#include <benchmark/benchmark.h>
+
+#include <boost/make_shared.hpp>
+#include <condition_variable>
+#include <cstdio>
+#include <deque>
+#include <map>
+#include <mutex>
+#include <string>
+#include <thread>
+#include <vector>
+
+#include "tasking/TaskManager.h"
+
+namespace {
+
+const int kTasksPerIteration = 20000;
+
+class EmptyTask : public Tasking::Task {
+public:
+    explicit EmptyTask(int* finished) : finished(finished) {}
+    void run() override { benchmark::DoNotOptimize(this); }
+    void onFinished() override { ++*finished; }
+
+private:
+    int* finished;
+};
+
+std::vector<boost::shared_ptr<Tasking::Task> > makeTasks(int* finished) {
+    std::vector<boost::shared_ptr<Tasking::Task> > tasks;
+    for (int i = 0; i < kTasksPerIteration; ++i) {
+        tasks.push_back(boost::make_shared<EmptyTask>(finished));
+    }
+    return tasks;
+}
+
+void BM_TaskManager(benchmark::State& state) {
+    int finished = 0;
+    std::vector<boost::shared_ptr<Tasking::Task> > tasks = makeTasks(&finished);
+    boost::shared_ptr<Tasking::TaskManager> manager = Tasking::TaskManager::create();
+    for (auto _ : state) {
+        finished = 0;
+        for (const boost::shared_ptr<Tasking::Task>& task : tasks) {
+            manager->schedule(task, 0);
+        }
+        while (finished < kTasksPerIteration) {
+            kdWaitEvent(static_cast<KDust>(-1));
+        }
+    }
+    state.SetItemsProcessed(state.iterations() * kTasksPerIteration);
+}
+BENCHMARK(BM_TaskManager)->UseRealTime()->Unit(benchmark::kMillisecond);
+
+// The textbook handoff: push under the lock and notify; the receiver waits,
+// pops one item under the lock and handles it outside.
+class BareQueue {
+public:
+    void push(Tasking::Task* task) {
+        {
+            std::lock_guard<std::mutex> lock(mutex);
+            queue.push_back(task);
+        }
+        changed.notify_one();
+    }
+    // Null ends the worker.
+    Tasking::Task* pop() {
+        std::unique_lock<std::mutex> lock(mutex);
+        changed.wait(lock, [this] { return !queue.empty(); });
+        Tasking::Task* task = queue.front();
+        queue.pop_front();
+        return task;
+    }
+
+private:
+    std::mutex mutex;
+    std::condition_variable changed;
+    std::deque<Tasking::Task*> queue;
+};
+
+void BM_BareWorkerThread(benchmark::State& state) {
+    int finished = 0;
+    std::vector<boost::shared_ptr<Tasking::Task> > tasks = makeTasks(&finished);
+    BareQueue work;
+    BareQueue results;
+    std::thread worker([&work, &results] {
+        while (Tasking::Task* task = work.pop()) {
+            task->run();
+            results.push(task);
+        }
+    });
+    for (auto _ : state) {
+        finished = 0;
+        for (const boost::shared_ptr<Tasking::Task>& task : tasks) {
+            work.push(task.get());
+        }
+        while (finished < kTasksPerIteration) {
+            results.pop()->onFinished();
+        }
+    }
+    work.push(nullptr);
+    worker.join();
+    state.SetItemsProcessed(state.iterations() * kTasksPerIteration);
+}
+BENCHMARK(BM_BareWorkerThread)->UseRealTime()->Unit(benchmark::kMillisecond);
+
+// Keeps each benchmark's rate so that the ratio can be printed at the end.
+class RateReporter : public benchmark::ConsoleReporter {
+public:
+    void ReportRuns(const std::vector<Run>& runs) override {
+        // With repetitions, the median overrides the single runs.
+        for (const Run& run : runs) {
+            auto rate = run.counters.find("items_per_second");
+            bool median = run.run_type == Run::RT_Aggregate && run.aggregate_name == "median";
+            if (rate != run.counters.end() && (run.run_type == Run::RT_Iteration || median)) {
+                rates[run.run_name.function_name] = rate->second.value;
+            }
+        }
+        ConsoleReporter::ReportRuns(runs);
+    }
+    std::map<std::string, double> rates;
+};
+
+}  // namespace
+
+int main(int argc, char** argv) {
+    benchmark::Initialize(&argc, argv);
+    RateReporter reporter;
+    benchmark::RunSpecifiedBenchmarks(&reporter);
+    double ours = reporter.rates["BM_TaskManager"];
+    double bare = reporter.rates["BM_BareWorkerThread"];
+    if (ours > 0 && bare > 0) {
+        std::printf("TaskManager: %.0f tasks/s, bare worker thread: %.0f tasks/s, ratio %.2f\n", ours, bare,
+                    ours / bare);
+    }
+    benchmark::Shutdown();
+    return 0;
+}
