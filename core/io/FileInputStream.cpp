@@ -28,14 +28,14 @@ long long FileInputStream::available() {
     return size - kdFtell(file);
 }
 
-int FileInputStream::read(void* buffer, int length) {
-    if (length <= 0) {
-        KD_ASSERT(length >= 0);
+int FileInputStream::read(void* buffer, int len) {
+    KD_ASSERT(len >= 0);
+    if (len <= 0) {
         return 0;
     }
-    int count = static_cast<int>(kdFread(buffer, 1, length, file));
-    if (count != length) {
-        std::memset(buffer, 0, length);
+    int count = static_cast<int>(kdFread(buffer, 1, len, file));
+    if (count != len) {
+        std::memset(buffer, 0, len);
         handleBadState();
     }
     return count;

@@ -339,3 +339,26 @@ TEST_F(StreamTest, AWindowReadsItsOwnBytesAfterSomeoneElseMovedTheInnerStream) {
     EXPECT_EQ(data[1], first.readUByte());
     EXPECT_EQ(data[21], second.readUByte());
 }
+
+namespace {
+
+// Claims data but fails every read, as a damaged inflating entry does.
+class FailingStream : public IO::InputStream {
+public:
+    long long available() override { return 100; }
+    int read(void*, int) override { return -1; }
+    long long tell() override { return 0; }
+    void seek(long long, KDfileSeekOrigin) override {}
+};
+
+}  // namespace
+
+TEST_F(StreamTest, LineAndZeroTerminatedReadersEndOnAFailingStream) {
+    FailingStream stream;
+    std::string text = "x";
+    EXPECT_TRUE(stream.readCRLFString(text));
+    EXPECT_EQ("", text);
+    EXPECT_TRUE(stream.readZString(text));
+    EXPECT_EQ("", text);
+    EXPECT_EQ(0, stream.readInt());
+}
