@@ -208,17 +208,6 @@ TEST_F(ResourceFileTest, AMissingResourceIsLoggedAndEmpty) {
     EXPECT_TRUE(hasLogLine("File Y not found in resource"));
 }
 
-TEST_F(ResourceFileTest, AStreamKeepsItsPackageAliveAfterEverythingElseIsGone) {
-    {
-        PackageBuilder builder(package, 400);
-        builder.addResource("X", thousand.data(), thousand.size(), false);
-    }
-    boost::shared_ptr<IO::InputStream> stream =
-        openResource("X", ResourceFile::createFileSystem(packageStream()));
-    ASSERT_TRUE(stream);
-    EXPECT_EQ(thousand, readAll(*stream));
-}
-
 TEST_F(ResourceFileTest, AnUnreadablePackageGivesNoIndex) {
     Bytes garbage = bytesOf("this is not a zip archive at all");
     boost::shared_ptr<IO::InputStream> stream =

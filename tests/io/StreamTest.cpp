@@ -69,12 +69,6 @@ TEST_F(StreamTest, EveryEncodedTypeRoundTrips) {
     EXPECT_EQ(0, in.available());
 }
 
-TEST_F(StreamTest, ABoolIsTrueForAnyNonZeroByte) {
-    Bytes data = {0x7F};
-    IO::ByteArrayInputStream in(data.data(), 1);
-    EXPECT_TRUE(in.readBool());
-}
-
 TEST_F(StreamTest, EmptyStringsHaveTheirMinimalEncodings) {
     IO::ByteArrayOutputStream zero;
     zero.writeZString("");

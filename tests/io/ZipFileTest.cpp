@@ -93,14 +93,6 @@ TEST_F(ZipFileTest, StoredAndDeflatedEntriesReadBackThroughTheirStreamKinds) {
     EXPECT_EQ(binary, readAll(*cachedStream));
 }
 
-TEST_F(ZipFileTest, LookupIsExactAndCaseSensitive) {
-    boost::shared_ptr<ZipFile> zip = open(archive({{"Icon.png", text, false, {}}}));
-    ASSERT_TRUE(zip);
-    EXPECT_TRUE(zip->findEntry("Icon.png"));
-    EXPECT_FALSE(zip->findEntry("icon.png"));
-    EXPECT_FALSE(zip->findEntry("Icon"));
-}
-
 TEST_F(ZipFileTest, AnUncachedStreamInflatesWhileReadingAndOwnsTheArchiveMeanwhile) {
     boost::shared_ptr<ZipFile> zip = open(archive({{"a.txt", text, false, {}}, {"b.bin", binary, true, {}}}));
     ASSERT_TRUE(zip);
