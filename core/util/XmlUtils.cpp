@@ -1,0 +1,168 @@
+#include "util/XmlUtils.h"
+
+#include <KD/kd.h>
+#include <tinyxml.h>
+
+#include <climits>
+#include <cstdlib>
+
+#include "io/ByteArrayInputStream.h"
+#include "io/zip/GzipInputStream.h"
+#include "util/TagCollectionHandler.h"
+
+namespace Util {
+
+namespace {
+
+bool equalsIgnoringCase(const char* text, const char* lowerCaseWord) {
+    for (; *text != '\0' && *lowerCaseWord != '\0'; ++text, ++lowerCaseWord) {
+        char c = *text;
+        if (c >= 'A' && c <= 'Z') {
+            c = static_cast<char>(c - 'A' + 'a');
+        }
+        if (c != *lowerCaseWord) {
+            return false;
+        }
+    }
+    return *text == '\0' && *lowerCaseWord == '\0';
+}
+
+const char* textOf(const TiXmlElement* element) {
+    return element ? element->GetText() : nullptr;
+}
+
+const TiXmlElement* childOf(const TiXmlElement* element, const char* name) {
+    return element ? element->FirstChildElement(name) : nullptr;
+}
+
+}  // namespace
+
+bool XmlUtils::load(const std::vector<unsigned char>& bytes, bool gzipped, TiXmlDocument& doc) {
+    if (bytes.size() > static_cast<size_t>(INT_MAX)) {
+        doc.Clear();
+        return false;
+    }
+    IO::ByteArrayInputStream plain(bytes.data(), static_cast<int>(bytes.size()));
+    if (!gzipped) {
+        return load(&plain, doc);
+    }
+    IO::Zip::GzipInputStream inflated(&plain);
+    return load(&inflated, doc);
+}
+
+bool XmlUtils::load(IO::InputStream* stream, TiXmlDocument& doc) {
+    KD_ASSERT(stream);
+    doc.Clear();
+    if (!stream) {
+        return false;
+    }
+    const long long left = stream->available();
+    // One byte stays free for the terminator TinyXML parses up to.
+    const int size = left <= 0 ? 0 : (left >= INT_MAX ? INT_MAX - 1 : static_cast<int>(left));
+    std::vector<char> text(static_cast<size_t>(size) + 1, '\0');
+    const int got = size > 0 ? stream->read(text.data(), size) : 0;
+    text[got > 0 ? got : 0] = '\0';
+    doc.Parse(text.data(), nullptr, TIXML_DEFAULT_ENCODING);
+    return !doc.Error();
+}
+
+std::string XmlUtils::getText(const TiXmlElement* element, const std::string& defaultValue) {
+    const char* text = textOf(element);
+    return text ? std::string(text) : defaultValue;
+}
+
+int XmlUtils::getValueAsInt(const TiXmlElement* element) {
+    const char* text = textOf(element);
+    return text ? std::atoi(text) : 0;
+}
+
+float XmlUtils::getValueAsFloat(const TiXmlElement* element) {
+    const char* text = textOf(element);
+    return text ? static_cast<float>(std::strtod(text, nullptr)) : 0.0f;
+}
+
+bool XmlUtils::getChildValueAsInt(const TiXmlElement* element, const char* name, int& value) {
+    const TiXmlElement* child = childOf(element, name);
+    if (!child) {
+        return false;
+    }
+    value = getValueAsInt(child);
+    return true;
+}
+
+bool XmlUtils::getChildValueAsUInt(const TiXmlElement* element, const char* name, unsigned int& value) {
+    const TiXmlElement* child = childOf(element, name);
+    if (!child) {
+        return false;
+    }
+    const char* text = textOf(child);
+    const long long number = text ? std::strtoll(text, nullptr, 10) : 0;
+    if (number < 0 || number > static_cast<long long>(UINT_MAX)) {
+        return false;
+    }
+    value = static_cast<unsigned int>(number);
+    return true;
+}
+
+bool XmlUtils::getChildValueAsString(const TiXmlElement* element, const char* name, std::string& value) {
+    const TiXmlElement* child = childOf(element, name);
+    if (!child) {
+        return false;
+    }
+    value = getText(child, std::string());
+    return true;
+}
+
+const char* XmlUtils::getStringAttr(const TiXmlElement* element, const char* name, const char* defaultValue) {
+    const char* text = element ? element->Attribute(name) : nullptr;
+    return text ? text : defaultValue;
+}
+
+int XmlUtils::getIntAttr(const TiXmlElement* element, const char* name, int defaultValue) {
+    int value = defaultValue;
+    if (!element || element->QueryIntAttribute(name, &value) != TIXML_SUCCESS) {
+        return defaultValue;
+    }
+    return value;
+}
+
+float XmlUtils::getFloatAttr(const TiXmlElement* element, const char* name, float defaultValue) {
+    float value = defaultValue;
+    if (!element || element->QueryFloatAttribute(name, &value) != TIXML_SUCCESS) {
+        return defaultValue;
+    }
+    return value;
+}
+
+bool XmlUtils::getBoolAttr(const TiXmlElement* element, const char* name) {
+    const char* text = element ? element->Attribute(name) : nullptr;
+    if (!text) {
+        return false;
+    }
+    return kdStrcmp(text, "0") != 0 && !equalsIgnoringCase(text, "false");
+}
+
+bool XmlUtils::parseTagCollections(const char* collectionTag, const char* itemTag, const TiXmlElement* parent,
+                                   TagCollectionHandler& handler) {
+    KD_ASSERT(parent);
+    if (!parent) {
+        return false;
+    }
+    bool found = false;
+    for (const TiXmlElement* collection = parent->FirstChildElement(collectionTag); collection;
+         collection = collection->NextSiblingElement(collectionTag)) {
+        found = true;
+        if (!handler.onCollectionTag(collection)) {
+            return false;
+        }
+        for (const TiXmlElement* item = collection->FirstChildElement(itemTag); item;
+             item = item->NextSiblingElement(itemTag)) {
+            if (!handler.onItemTag(item)) {
+                return false;
+            }
+        }
+    }
+    return found || handler.onCollectionTagNotFound();
+}
+
+}  // namespace Util
