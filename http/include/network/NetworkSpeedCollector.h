@@ -1,0 +1,22 @@
+#pragma once
+
+namespace Network {
+
+class DataChunk;
+class HttpConnection;
+
+// Receives the HTTP engine's measurements of one request, keyed by the id the
+// connection was made with. Called on the engine thread; the pointers are
+// valid only during the call.
+class NetworkSpeedCollector {
+public:
+    virtual ~NetworkSpeedCollector() {}
+    // The request left (its size is then known through the connection).
+    virtual void onRequestSent(int id, HttpConnection* connection) = 0;
+    virtual void onRequestFinished(int id) = 0;
+    // One block of response body as it arrived from the socket.
+    virtual void onDataChunkReceived(int id, DataChunk* dataChunk) = 0;
+    virtual void onRequestCanceled(int id) = 0;
+};
+
+}  // namespace Network

@@ -1,0 +1,66 @@
+#pragma once
+
+#include <KD/kd.h>
+
+#include <boost/enable_shared_from_this.hpp>
+#include <boost/shared_ptr.hpp>
+#include <boost/weak_ptr.hpp>
+#include <deque>
+
+#include "network/DataChunk.h"
+#include "network/HttpResponse.h"
+
+namespace Network {
+
+class HttpConnection;
+
+// Carries one connection's results from the engine thread to its caller
+// thread. push and detach may be called from any thread; construction and
+// delivery happen on the caller thread.
+//
+// Every wake-up event holds a reference to the queue, so an event queued
+// after a cancel or after the connection went away finds the queue alive and
+// detached, and delivers nothing.
+class HttpDeliveryQueue : public boost::enable_shared_from_this<HttpDeliveryQueue> {
+public:
+    struct Delivery {
+        enum Kind { Response, BodyData, Finished };
+        Kind kind;
+        boost::shared_ptr<HttpResponse> response;
+        boost::shared_ptr<DataChunk> chunk;
+        int code;
+    };
+
+    // Binds the delivery handler on the calling thread, which becomes the
+    // thread the results go to.
+    explicit HttpDeliveryQueue(const boost::weak_ptr<HttpConnection>& connection);
+    ~HttpDeliveryQueue();
+
+    void pushResponse(const boost::shared_ptr<HttpResponse>& response);
+    void pushBodyData(const boost::shared_ptr<DataChunk>& chunk);
+    void pushFinished(int code);
+    // Nothing queued or pushed later is delivered any more.
+    void detach();
+    bool isDetached() const;
+
+private:
+    HttpDeliveryQueue(const HttpDeliveryQueue&) = delete;
+    HttpDeliveryQueue& operator=(const HttpDeliveryQueue&) = delete;
+
+    static void onEvent(const KDEvent* event);
+
+    void push(const Delivery& delivery);
+    // One result at a time, so that a cancel from inside a callback stops the
+    // rest.
+    bool takeNext(Delivery& delivery);
+    void deliverPending();
+
+    KDThread* callerThread;
+    boost::weak_ptr<HttpConnection> connection;
+    KDThreadMutex* mutex;
+    std::deque<Delivery> pending;
+    bool eventPosted;
+    bool detached;
+};
+
+}  // namespace Network

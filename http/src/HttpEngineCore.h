@@ -1,0 +1,75 @@
+#pragma once
+
+#include <KD/kd.h>
+#include <curl/curl.h>
+
+#include <boost/enable_shared_from_this.hpp>
+#include <boost/shared_ptr.hpp>
+#include <boost/unordered_map.hpp>
+#include <vector>
+
+namespace Network {
+
+class HttpTransfer;
+
+// The engine thread and the libcurl multi handle it drives. Other threads
+// talk to it only through add, remove and resume, which queue a command and
+// wake the thread; everything else runs on the engine thread.
+class HttpEngineCore : public boost::enable_shared_from_this<HttpEngineCore> {
+public:
+    // HttpEngine's lifetime: the first acquire starts the engine, the release
+    // matching the last acquire stops it.
+    static boost::shared_ptr<HttpEngineCore> acquire();
+    static void release();
+    // The running engine, or empty.
+    static boost::shared_ptr<HttpEngineCore> current();
+
+    ~HttpEngineCore();
+
+    // Any thread. False when the engine is stopping and takes nothing new.
+    bool add(const boost::shared_ptr<HttpTransfer>& transfer);
+    void remove(const boost::shared_ptr<HttpTransfer>& transfer);
+    void resume(const boost::shared_ptr<HttpTransfer>& transfer);
+
+private:
+    struct Command {
+        enum Kind { Add, Remove, Resume };
+        Kind kind;
+        boost::shared_ptr<HttpTransfer> transfer;
+    };
+
+    HttpEngineCore();
+    HttpEngineCore(const HttpEngineCore&) = delete;
+    HttpEngineCore& operator=(const HttpEngineCore&) = delete;
+
+    bool startThread();
+    void stopThread();
+    bool queue(const Command& command);
+
+    static void* threadMain(void* self);
+    void run();
+    // Takes the queued commands; false once the engine is to stop.
+    bool takeCommands(std::vector<Command>& taken);
+    void execute(const Command& command);
+    void startTransfer(const boost::shared_ptr<HttpTransfer>& transfer);
+    void cancelTransfer(const boost::shared_ptr<HttpTransfer>& transfer);
+    void completeDoneTransfers();
+    void expireSilentTransfers();
+    int pollTimeoutMs();
+    void detach(const boost::shared_ptr<HttpTransfer>& transfer);
+    void failAll(int code);
+    CURL* takeHandle();
+    void returnHandle(CURL* handle);
+
+    KDThreadMutex* mutex;
+    std::vector<Command> commands;
+    bool stopping;
+    CURLM* multi;
+    KDThread* thread;
+
+    // Engine thread only.
+    boost::unordered_map<CURL*, boost::shared_ptr<HttpTransfer> > running;
+    std::vector<CURL*> spareHandles;
+};
+
+}  // namespace Network

@@ -1,0 +1,166 @@
+#pragma once
+
+#include <KD/kd.h>
+#include <pal/Simulation.h>
+
+#include <boost/make_shared.hpp>
+#include <boost/shared_ptr.hpp>
+#include <chrono>
+#include <functional>
+#include <memory>
+#include <mutex>
+#include <string>
+#include <vector>
+
+#include "network/DataChunk.h"
+#include "network/HttpConnection.h"
+#include "network/HttpEngine.h"
+#include "network/HttpFinishCodes.h"
+#include "network/HttpRequest.h"
+#include "network/HttpResponse.h"
+#include "network/NetworkSpeedCollector.h"
+#include "support/PalTest.h"
+#include "support/TestHttpServer.h"
+
+// The platform booted on the real clock (network waits are real) with an
+// HttpEngine and a loopback server running for the test.
+class HttpTest : public PalTest {
+protected:
+    void beforePalStart() override { pal::useRealClock(); }
+    void SetUp() override {
+        PalTest::SetUp();
+        engine.reset(new Network::HttpEngine());
+        server.reset(new TestHttpServer());
+    }
+    // The engine goes first: its closed connections let the server's threads
+    // stop at once instead of waiting out keep-alive.
+    void TearDown() override {
+        engine.reset();
+        server.reset();
+        PalTest::TearDown();
+    }
+
+    // Pumps the calling thread's events until condition holds or the bound
+    // (a generous wait limit, not a timing expectation) runs out.
+    static bool waitFor(const std::function<bool()>& condition,
+                        std::chrono::milliseconds bound = std::chrono::seconds(10)) {
+        const auto end = std::chrono::steady_clock::now() + bound;
+        while (!condition()) {
+            if (std::chrono::steady_clock::now() >= end) {
+                return false;
+            }
+            kdWaitEvent(5 * 1000 * 1000);
+        }
+        return true;
+    }
+
+    std::unique_ptr<Network::HttpEngine> engine;
+    std::unique_ptr<TestHttpServer> server;
+};
+
+// Records what one connection delivers, in order, on the thread that pumps.
+class Recorder {
+public:
+    explicit Recorder(const boost::shared_ptr<Network::HttpRequest>& request, bool wholeBody = true,
+                      const boost::weak_ptr<Network::NetworkSpeedCollector>& collector =
+                          boost::weak_ptr<Network::NetworkSpeedCollector>(),
+                      int id = 0)
+        : connection(boost::make_shared<Network::HttpConnection>(request, collector, id)) {
+        connection->setOnResponseReceivedCallback(
+            Network::HttpConnection::OnResponseReceivedCallback::make<Recorder, &Recorder::onResponse>(this));
+        connection->setOnBodyDataReceivedCallback(
+            Network::HttpConnection::OnBodyDataReceivedCallback::make<Recorder, &Recorder::onBody>(this),
+            wholeBody);
+        connection->setOnFinishedCallback(
+            Network::HttpConnection::OnFinishedCallback::make<Recorder, &Recorder::onFinished>(this));
+    }
+
+    static boost::shared_ptr<Network::HttpRequest> get(const std::string& url, int timeoutMs = 10000) {
+        return Network::HttpRequest::create(url.c_str(), "GET", timeoutMs, false);
+    }
+
+    void start() { connection->start(); }
+    bool finished() const { return finishCount > 0; }
+    int status() const { return response ? response->getStatusCode() : 0; }
+
+    boost::shared_ptr<Network::HttpConnection> connection;
+    // "response", "body" and "finished", in delivery order.
+    std::vector<std::string> events;
+    boost::shared_ptr<Network::HttpResponse> response;
+    std::string body;
+    std::vector<std::size_t> partSizes;
+    int code = 1;
+    int finishCount = 0;
+    std::vector<KDThread*> threads;
+    // Runs after each delivery is recorded, e.g. to cancel from inside it.
+    std::function<void(const std::string& event)> afterEvent;
+
+private:
+    void note(const std::string& event) {
+        events.push_back(event);
+        threads.push_back(kdThreadSelf());
+        if (afterEvent) {
+            afterEvent(event);
+        }
+    }
+    void onResponse(boost::shared_ptr<Network::HttpConnection> from,
+                    boost::shared_ptr<Network::HttpResponse> received) {
+        EXPECT_EQ(from, connection);
+        response = received;
+        note("response");
+    }
+    void onBody(boost::shared_ptr<Network::HttpConnection> from,
+                boost::shared_ptr<Network::DataChunk> chunk) {
+        EXPECT_EQ(from, connection);
+        body.append(chunk->begin(), chunk->end());
+        partSizes.push_back(chunk->size());
+        note("body");
+    }
+    void onFinished(boost::shared_ptr<Network::HttpConnection> from, int finishCode) {
+        EXPECT_EQ(from, connection);
+        code = finishCode;
+        ++finishCount;
+        note("finished");
+    }
+};
+
+// A speed collector that writes down its reports (made on the engine thread).
+class RecordingCollector : public Network::NetworkSpeedCollector {
+public:
+    struct Report {
+        std::string kind;  // "sent", "chunk", "finished", "canceled"
+        int id;
+        long long size;    // request size for "sent", bytes for "chunk"
+        std::string path;  // for "sent"
+    };
+
+    void onRequestSent(int id, Network::HttpConnection* connection) override {
+        add({"sent", id, connection->getRequestSize(), connection->getRequestPath()});
+    }
+    void onRequestFinished(int id) override { add({"finished", id, 0, ""}); }
+    void onDataChunkReceived(int id, Network::DataChunk* chunk) override {
+        add({"chunk", id, static_cast<long long>(chunk->size()), ""});
+    }
+    void onRequestCanceled(int id) override { add({"canceled", id, 0, ""}); }
+
+    std::vector<Report> reports() const {
+        std::lock_guard<std::mutex> lock(mutex);
+        return recorded;
+    }
+    int count(const std::string& kind) const {
+        int total = 0;
+        for (const Report& report : reports()) {
+            total += report.kind == kind ? 1 : 0;
+        }
+        return total;
+    }
+
+private:
+    void add(const Report& report) {
+        std::lock_guard<std::mutex> lock(mutex);
+        recorded.push_back(report);
+    }
+
+    mutable std::mutex mutex;
+    std::vector<Report> recorded;
+};
