@@ -2,8 +2,11 @@
 // the worker, onFinished() back on the owner, which pumps platform events;
 // against a bare worker thread fed through a std::mutex +
 // std::condition_variable queue that hands each result back to the owner
-// through a second such queue. Both run the same task objects.
-#include <KD/kd.h>
+// through a second such queue. Both run the same task objects and keep them
+// alive by shared pointer while they travel. The manager's worker yields
+// after every task, so the bare worker is also measured yielding, to tell the
+// cost of the yield from that of the manager.
+#include <KD/kdext.h>
 #include <benchmark/benchmark.h>
 
 #include <boost/make_shared.hpp>
@@ -61,18 +64,18 @@ BENCHMARK(BM_TaskManager)->UseRealTime()->Unit(benchmark::kMillisecond);
 // pops one item under the lock and handles it outside.
 class BareQueue {
 public:
-    void push(Tasking::Task* task) {
+    void push(boost::shared_ptr<Tasking::Task> task) {
         {
             std::lock_guard<std::mutex> lock(mutex);
-            queue.push_back(task);
+            queue.push_back(std::move(task));
         }
         changed.notify_one();
     }
-    // Null ends the worker.
-    Tasking::Task* pop() {
+    // An empty pointer ends the worker.
+    boost::shared_ptr<Tasking::Task> pop() {
         std::unique_lock<std::mutex> lock(mutex);
         changed.wait(lock, [this] { return !queue.empty(); });
-        Tasking::Task* task = queue.front();
+        boost::shared_ptr<Tasking::Task> task = std::move(queue.front());
         queue.pop_front();
         return task;
     }
@@ -80,34 +83,46 @@ public:
 private:
     std::mutex mutex;
     std::condition_variable changed;
-    std::deque<Tasking::Task*> queue;
+    std::deque<boost::shared_ptr<Tasking::Task> > queue;
 };
 
-void BM_BareWorkerThread(benchmark::State& state) {
+void runBareWorker(benchmark::State& state, bool yield) {
     int finished = 0;
     std::vector<boost::shared_ptr<Tasking::Task> > tasks = makeTasks(&finished);
     BareQueue work;
     BareQueue results;
-    std::thread worker([&work, &results] {
-        while (Tasking::Task* task = work.pop()) {
+    std::thread worker([&work, &results, yield] {
+        while (boost::shared_ptr<Tasking::Task> task = work.pop()) {
             task->run();
-            results.push(task);
+            if (yield) {
+                kdThreadYieldZVR();
+            }
+            results.push(std::move(task));
         }
     });
     for (auto _ : state) {
         finished = 0;
         for (const boost::shared_ptr<Tasking::Task>& task : tasks) {
-            work.push(task.get());
+            work.push(task);
         }
         while (finished < kTasksPerIteration) {
             results.pop()->onFinished();
         }
     }
-    work.push(nullptr);
+    work.push(boost::shared_ptr<Tasking::Task>());
     worker.join();
     state.SetItemsProcessed(state.iterations() * kTasksPerIteration);
 }
+
+void BM_BareWorkerThread(benchmark::State& state) {
+    runBareWorker(state, false);
+}
 BENCHMARK(BM_BareWorkerThread)->UseRealTime()->Unit(benchmark::kMillisecond);
+
+void BM_BareWorkerThreadYielding(benchmark::State& state) {
+    runBareWorker(state, true);
+}
+BENCHMARK(BM_BareWorkerThreadYielding)->UseRealTime()->Unit(benchmark::kMillisecond);
 
 // Keeps each benchmark's rate so that the ratio can be printed at the end.
 class RateReporter : public benchmark::ConsoleReporter {
@@ -134,9 +149,12 @@ int main(int argc, char** argv) {
     benchmark::RunSpecifiedBenchmarks(&reporter);
     double ours = reporter.rates["BM_TaskManager"];
     double bare = reporter.rates["BM_BareWorkerThread"];
-    if (ours > 0 && bare > 0) {
-        std::printf("TaskManager: %.0f tasks/s, bare worker thread: %.0f tasks/s, ratio %.2f\n", ours, bare,
-                    ours / bare);
+    double bareYielding = reporter.rates["BM_BareWorkerThreadYielding"];
+    if (ours > 0 && bare > 0 && bareYielding > 0) {
+        std::printf(
+            "TaskManager: %.0f tasks/s; bare worker thread: %.0f tasks/s (ratio %.2f); "
+            "bare worker yielding after each task: %.0f tasks/s (ratio %.2f)\n",
+            ours, bare, ours / bare, bareYielding, ours / bareYielding);
     }
     benchmark::Shutdown();
     return 0;

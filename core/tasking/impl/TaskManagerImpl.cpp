@@ -32,6 +32,7 @@ TaskManagerImpl::TaskManagerImpl()
       lowPriorityMode(false),
       savedSchedPolicy(KD_THREAD_POLICY_NORMAL_ZVR),
       savedSchedParam(0),
+      notificationPending(false),
       destroyedDuringNotification(nullptr) {
     kdInstallCallback(&TaskManagerImpl::onTaskCompletedWrapper, KD_EVENT_USER, this);
     kdThreadMutexLock(mutex);
@@ -70,12 +71,12 @@ TaskManagerImpl::~TaskManagerImpl() {
 }
 
 void TaskManagerImpl::schedule(const boost::shared_ptr<Task>& task, int priority) {
+    boost::shared_ptr<TaskState> state = boost::make_shared<TaskState>(this);
     kdThreadMutexLock(mutex);
-    boost::shared_ptr<TaskState> state =
-        boost::make_shared<TaskState>(this, queue.end(), finishedTasks.end());
     task->state = state;
-    Key key = {priority, sequenceCounter++};
+    const Key key = {priority, sequenceCounter++};
     state->queuePosition = queue.insert(std::make_pair(key, task)).first;
+    state->finishedPosition = finishedTasks.end();
     const bool wakeWorker = queue.size() == 1 || (lowPriorityMode && priority > 0);
     kdThreadMutexUnlock(mutex);
     if (wakeWorker) {
@@ -179,12 +180,20 @@ void TaskManagerImpl::run() {
         kdThreadYieldZVR();
         kdThreadMutexLock(mutex);
         const bool wakeWaiter = finishCurrentTask();
-        kdThreadMutexUnlock(mutex);
-        if (wakeWaiter) {
-            kdThreadCondSignal(taskFinished);
+        // One event is enough while the owner has not started on the last
+        // one: its pass takes everything finished by then.
+        const bool notifyOwner = !notificationPending;
+        notificationPending = true;
+        if (wakeWaiter || notifyOwner) {
+            kdThreadMutexUnlock(mutex);
+            if (wakeWaiter) {
+                kdThreadCondSignal(taskFinished);
+            }
+            if (notifyOwner) {
+                postNotification();
+            }
+            kdThreadMutexLock(mutex);
         }
-        postCompletion();
-        kdThreadMutexLock(mutex);
     }
     kdThreadMutexUnlock(mutex);
 }
@@ -203,7 +212,7 @@ Task* TaskManagerImpl::takeNextTask() {
         }
         KD_ASSERT(!currentTask);
         Queue::iterator first = queue.begin();
-        currentTask = first->second;
+        currentTask = std::move(first->second);
         static_cast<TaskState*>(currentTask->state.get())->queuePosition = queue.end();
         queue.erase(first);
         return currentTask.get();
@@ -236,7 +245,7 @@ bool TaskManagerImpl::finishCurrentTask() {
     return wakeWaiter;
 }
 
-void TaskManagerImpl::postCompletion() {
+void TaskManagerImpl::postNotification() {
     KDEvent* event = kdCreateEvent();
     event->type = KD_EVENT_USER;
     event->userptr = this;
@@ -271,6 +280,8 @@ void TaskManagerImpl::onTaskCompleted() {
 // Stops as soon as an onFinished() has destroyed the manager.
 void TaskManagerImpl::notifyFinishedTasks(const bool& destroyed) {
     kdThreadMutexLock(mutex);
+    // What finishes from here on needs an event of its own.
+    notificationPending = false;
     while (!finishedTasks.empty()) {
         boost::shared_ptr<Task> task = std::move(finishedTasks.front());
         finishedTasks.pop_front();

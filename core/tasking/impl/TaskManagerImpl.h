@@ -41,9 +41,8 @@ public:
     // having its positions used in another manager's containers.
     class TaskState : public Task::State {
     public:
-        TaskState(TaskManagerImpl* manager, Queue::iterator queuePosition,
-                  FinishedList::iterator finishedPosition)
-            : manager(manager), queuePosition(queuePosition), finishedPosition(finishedPosition) {}
+        // Positions are set under the manager's lock.
+        explicit TaskState(TaskManagerImpl* manager) : manager(manager) {}
 
         TaskManagerImpl* const manager;
         // The queue's end when not queued.
@@ -72,7 +71,7 @@ private:
     Task* takeNextTask();
     bool isHeldBack(const Key& key) const;
     bool finishCurrentTask();
-    void postCompletion();
+    void postNotification();
 
     void onTaskCompleted();
     void notifyFinishedTasks(const bool& destroyed);
@@ -98,6 +97,8 @@ private:
     bool lowPriorityMode;
     KDint savedSchedPolicy;
     KDint savedSchedParam;
+    // An event is on its way to the owner and its pass has not begun.
+    bool notificationPending;
 
     // Owner thread only: set while a notification pass runs, so that a pass
     // whose onFinished() destroyed the manager stops touching it.
