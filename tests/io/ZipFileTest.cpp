@@ -149,15 +149,21 @@ TEST_F(ZipFileTest, EntryStreamsThatReadTheArchiveKeepTheZipFileAlive) {
     EXPECT_TRUE(watch.expired());
 }
 
-TEST_F(ZipFileTest, APreparedIndexIsUsedInPlace) {
+TEST_F(ZipFileTest, APreparedIndexIsCopiedOrShared) {
     Bytes bytes = archive({{"a.txt", text, false, {}}, {"b.bin", binary, true, {}}});
     boost::shared_ptr<ZipFile> first = open(bytes);
     ASSERT_TRUE(first);
-    boost::shared_ptr<ZipFile> second = boost::make_shared<ZipFile>();
-    ASSERT_TRUE(second->init(memoryStream(bytes), &first->getEntries()));
-    EXPECT_EQ(first->findEntry("b.bin"), second->findEntry("b.bin"));
-    EXPECT_EQ(binary, entryBytes(*second, "b.bin", true));
-    EXPECT_EQ(text, entryBytes(*second, "a.txt", true));
+    boost::shared_ptr<ZipFile> copied = boost::make_shared<ZipFile>();
+    ASSERT_TRUE(copied->init(memoryStream(bytes), &first->getEntries()));
+    EXPECT_NE(first->findEntry("b.bin"), copied->findEntry("b.bin"));
+    EXPECT_EQ(binary, entryBytes(*copied, "b.bin", true));
+
+    boost::shared_ptr<ZipFile> shared = boost::make_shared<ZipFile>();
+    ASSERT_TRUE(shared->initWithIndex(memoryStream(bytes), first->getIndex()));
+    EXPECT_EQ(first->findEntry("b.bin"), shared->findEntry("b.bin"));
+    first.reset();
+    EXPECT_EQ(binary, entryBytes(*shared, "b.bin", true));
+    EXPECT_EQ(text, entryBytes(*shared, "a.txt", true));
 }
 
 TEST_F(ZipFileTest, TheCentralExtraFieldIsKeptAsWritten) {

@@ -26,7 +26,7 @@ boost::shared_ptr<FileSystem> ResourceFile::createFileSystem(boost::shared_ptr<I
     if (!zip->init(package, nullptr)) {
         return boost::shared_ptr<FileSystem>();
     }
-    return boost::shared_ptr<FileSystem>(new FileSystemImpl(zip->getEntries()));
+    return boost::shared_ptr<FileSystem>(new FileSystemImpl(zip->getIndex()));
 }
 
 ResourceFile::ResourceFile(boost::shared_ptr<InputStream> package) : stream(package) {}
@@ -35,12 +35,12 @@ boost::shared_ptr<InputStream> ResourceFile::openInputStream(const std::string& 
                                                              boost::shared_ptr<FileSystem> packageIndex) {
     KD_ASSERT(!file);
     name = resourceName;
-    fileSystem = packageIndex ? packageIndex : createFileSystem(stream);
+    boost::shared_ptr<FileSystem> fileSystem = packageIndex ? packageIndex : createFileSystem(stream);
     if (!fileSystem) {
         return boost::shared_ptr<InputStream>();
     }
     file.reset(new Zip::ZipFile());
-    if (!file->init(stream, &static_cast<const FileSystemImpl&>(*fileSystem).getEntries())) {
+    if (!file->initWithIndex(stream, static_cast<const FileSystemImpl&>(*fileSystem).getEntries())) {
         KD_ASSERT(false);
         return boost::shared_ptr<InputStream>();
     }

@@ -33,8 +33,6 @@ public:
 private:
     boost::shared_ptr<InputStream> stream;
     std::string name;
-    // Holds the index that file uses in place.
-    boost::shared_ptr<FileSystem> fileSystem;
     boost::shared_ptr<Zip::ZipFile> file;
 };
 

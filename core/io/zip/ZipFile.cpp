@@ -1,5 +1,6 @@
 #include "io/zip/ZipFile.h"
 
+#include <boost/make_shared.hpp>
 #include <climits>
 #include <new>
 #include <vector>
@@ -75,7 +76,29 @@ int ZCALLBACK ZipFile::testError(voidpf, voidpf) {
 }
 
 bool ZipFile::init(boost::shared_ptr<InputStream> archive, const ZipEntryMap* preparedEntries) {
+    if (!open(archive)) {
+        return false;
+    }
+    if (preparedEntries) {
+        index = boost::make_shared<const ZipEntryMap>(*preparedEntries);
+        return true;
+    }
+    return buildIndex();
+}
+
+bool ZipFile::initWithIndex(boost::shared_ptr<InputStream> archive,
+                            boost::shared_ptr<const ZipEntryMap> preparedEntries) {
+    KD_ASSERT(preparedEntries);
+    if (!preparedEntries || !open(archive)) {
+        return false;
+    }
+    index = preparedEntries;
+    return true;
+}
+
+bool ZipFile::open(boost::shared_ptr<InputStream> archive) {
     KD_ASSERT(!file);
+    index = boost::make_shared<const ZipEntryMap>();
     stream = archive;
     functions.zopen64_file = &ZipFile::openFile;
     functions.zread_file = &ZipFile::readFile;
@@ -91,11 +114,7 @@ bool ZipFile::init(boost::shared_ptr<InputStream> archive, const ZipEntryMap* pr
         KD_ASSERT(false);
         return false;
     }
-    if (preparedEntries) {
-        index = preparedEntries;
-        return true;
-    }
-    return buildIndex();
+    return true;
 }
 
 bool ZipFile::buildIndex() {
@@ -104,6 +123,7 @@ bool ZipFile::buildIndex() {
         KD_ASSERT(false);
         return false;
     }
+    boost::shared_ptr<ZipEntryMap> entries = boost::make_shared<ZipEntryMap>();
     for (ZPOS64_T i = 0; i < info.number_entry; ++i) {
         int result = i == 0 ? unzGoToFirstFile(file) : unzGoToNextFile(file);
         if (result != UNZ_OK) {
@@ -115,8 +135,9 @@ bool ZipFile::buildIndex() {
             KD_ASSERT(false);
             return false;
         }
-        entries[entry.name] = entry;
+        (*entries)[entry.name] = entry;
     }
+    index = entries;
     return true;
 }
 

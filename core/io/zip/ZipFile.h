@@ -21,14 +21,19 @@ public:
     ZipFile();
     ~ZipFile();
 
-    // Opens the archive. With preparedEntries (an index made earlier from the same archive)
-    // the central directory is not read again; that index is used in place and must outlive
-    // this zip file. False, with an assertion failure, when the archive cannot be read.
+    // Opens the archive. With preparedEntries (an index made earlier for the same archive)
+    // the central directory is not read again and the index is copied. False, with an
+    // assertion failure, when the archive cannot be read.
     bool init(boost::shared_ptr<InputStream> archive, const ZipEntryMap* preparedEntries);
+    // The same with a prepared index that is shared rather than copied, so that opening an
+    // entry of a large package costs no copy of its index.
+    bool initWithIndex(boost::shared_ptr<InputStream> archive,
+                       boost::shared_ptr<const ZipEntryMap> preparedEntries);
 
     // Exact, case-sensitive lookup; null when absent.
     const ZipEntry* findEntry(const std::string& name) const;
     const ZipEntryMap& getEntries() const { return *index; }
+    boost::shared_ptr<const ZipEntryMap> getIndex() const { return index; }
 
     // A stored entry comes as a window of the archive stream whatever cached says; a compressed
     // one either inflated whole into memory (cached) or inflated while read (uncached, one at a
@@ -38,6 +43,7 @@ public:
 private:
     friend class UncachedZipInputStream;
 
+    bool open(boost::shared_ptr<InputStream> archive);
     bool buildIndex();
     bool readCurrentEntry(ZipEntry& entry);
     boost::shared_ptr<InputStream> inflateWhole(const ZipEntry& entry);
@@ -55,8 +61,7 @@ private:
     boost::shared_ptr<InputStream> stream;
     unzFile file = nullptr;
     zlib_filefunc64_def functions;
-    ZipEntryMap entries;
-    const ZipEntryMap* index = &entries;
+    boost::shared_ptr<const ZipEntryMap> index;
 };
 
 }  // namespace Zip

@@ -1,5 +1,7 @@
 #pragma once
 
+#include <boost/shared_ptr.hpp>
+
 #include "io/resource/FileSystem.h"
 #include "io/zip/ZipEntry.h"
 
@@ -10,12 +12,13 @@ namespace Resource {
 // changed afterwards, so any thread may read it.
 class FileSystemImpl : public FileSystem {
 public:
-    explicit FileSystemImpl(const Zip::ZipEntryMap& entries) : entries(entries) {}
+    explicit FileSystemImpl(boost::shared_ptr<const Zip::ZipEntryMap> entries) : entries(entries) {}
 
-    const Zip::ZipEntryMap& getEntries() const { return entries; }
+    // Shared with the zip readers of the resources opened from it.
+    boost::shared_ptr<const Zip::ZipEntryMap> getEntries() const { return entries; }
 
 private:
-    const Zip::ZipEntryMap entries;
+    const boost::shared_ptr<const Zip::ZipEntryMap> entries;
 };
 
 }  // namespace Resource
