@@ -141,8 +141,10 @@ void BaseView::shutdown() {
     resourceManager = nullptr;
     delete redrawManager;
     redrawManager = nullptr;
-    // Shown again, the view starts paused like its new redraw manager and
-    // waits for the next view resume.
+    // A redraw requested by the last tick must not reach a view without its
+    // managers. Shown again, the view starts paused like its new redraw
+    // manager, and the next view resume installs the handler again.
+    kdGFXSetRedrawHandler(this, nullptr);
     isViewPaused = true;
 }
 

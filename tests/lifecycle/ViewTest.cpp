@@ -352,6 +352,16 @@ TEST_F(ViewTest, ViewShownAgainAfterHidingIsResumedAgain) {
     EXPECT_EQ(view->journal, (Journal{"update 16", "draw"}));
 }
 
+TEST_F(ViewTest, RedrawStillQueuedWhenTheViewIsHiddenIsNotDrawn) {
+    showResumedAndIdle();
+    view->redraw();
+    TestApp::get()->hideView(view.get());
+
+    pump();
+
+    EXPECT_TRUE(view->journal.empty());
+}
+
 TEST_F(ViewTest, DeletedViewReceivesNoMoreEvents) {
     showResumedAndIdle();
     TestApp::get()->hideView(view.get());

@@ -230,13 +230,6 @@ TEST_F(ViewRedrawManagerTest, PauseStopsTheTimerAndResumeRestartsIt) {
     EXPECT_EQ(delegate.updates, (std::vector<int>{16, 16}));
 }
 
-TEST_F(ViewRedrawManagerTest, PausedTwiceOrResumedTwiceChangesNothing) {
-    EXPECT_FALSE(manager->onViewPaused());
-    EXPECT_TRUE(manager->onViewResumed());
-    EXPECT_FALSE(manager->onViewResumed());
-    EXPECT_TRUE(manager->onViewPaused());
-}
-
 TEST_F(ViewRedrawManagerTest, SchedulingOffTheMainThreadIsReportedAndRefused) {
     resumeAndSettle();
     struct Worker {
