@@ -13,6 +13,7 @@
 #include <vector>
 
 #include "Runtime.h"
+#include "SimInternal.h"
 #include "ThreadRecord.h"
 
 namespace pal::detail {
@@ -55,6 +56,36 @@ bool dispatch(KDThread* self, QueuedEvent* queued) {
     return true;
 }
 
+// An event that will never reach a callback still owns its payload (a record
+// to release, a fix to free); hand it back before the event goes.
+void freeUndelivered(QueuedEvent* queued) {
+    if (!queued->action && queued->timer == nullptr) {
+        releaseUndeliveredPayload(queued->event);
+    }
+    delete queued;
+}
+
+std::vector<QueuedEvent*> takeMatching(KDThread* thread, const std::function<bool(const KDEvent&)>& match) {
+    std::vector<QueuedEvent*> taken;
+    std::lock_guard<std::mutex> lock(thread->queueMutex);
+    auto& queue = thread->queue;
+    for (auto it = queue.begin(); it != queue.end();) {
+        if (match((*it)->event)) {
+            taken.push_back(*it);
+            it = queue.erase(it);
+        } else {
+            ++it;
+        }
+    }
+    return taken;
+}
+
+void discardUndelivered(KDThread* thread, const std::function<bool(const KDEvent&)>& match) {
+    for (QueuedEvent* queued : takeMatching(thread, match)) {
+        freeUndelivered(queued);
+    }
+}
+
 std::size_t queueLength(KDThread* self) {
     std::lock_guard<std::mutex> lock(self->queueMutex);
     return self->queue.size();
@@ -72,26 +103,13 @@ void post(KDThread* thread, KDEvent* event) {
 }
 
 void discardEvents(KDThread* thread, const std::function<bool(const KDEvent&)>& match) {
-    std::vector<QueuedEvent*> discarded;
-    {
-        std::lock_guard<std::mutex> lock(thread->queueMutex);
-        auto& queue = thread->queue;
-        for (auto it = queue.begin(); it != queue.end();) {
-            if (match((*it)->event)) {
-                discarded.push_back(*it);
-                it = queue.erase(it);
-            } else {
-                ++it;
-            }
-        }
-    }
-    for (QueuedEvent* queued : discarded) {
+    for (QueuedEvent* queued : takeMatching(thread, match)) {
         delete queued;
     }
 }
 
 void discardAllEvents(KDThread* thread) {
-    discardEvents(thread, [](const KDEvent&) { return true; });
+    discardUndelivered(thread, [](const KDEvent&) { return true; });
 }
 
 void pumpThread(KDThread* self) {
@@ -104,7 +122,7 @@ void pumpThread(KDThread* self) {
             break;
         }
         if (!dispatch(self, queued)) {
-            delete queued;  // nobody listens: dropped, as OpenKODE does for kdPumpEvents
+            freeUndelivered(queued);  // nobody listens: dropped, as OpenKODE does for kdPumpEvents
         }
     }
 }
@@ -144,7 +162,7 @@ KDint kdInstallCallback(KDCallbackFunc* func, KDint eventtype, void* eventuserpt
     // The owner of userptr is going away: its pending events must not reach a
     // later object that happens to get the same address.
     if (eventuserptr != nullptr) {
-        pal::detail::discardEvents(self, [eventtype, eventuserptr](const KDEvent& event) {
+        pal::detail::discardUndelivered(self, [eventtype, eventuserptr](const KDEvent& event) {
             return event.type == eventtype && event.userptr == eventuserptr;
         });
     }

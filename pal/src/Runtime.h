@@ -16,7 +16,8 @@ KDThread* mainThread();
 // Posts a copy-free event to a thread's queue; takes ownership (kdPostThreadEvent).
 void post(KDThread* thread, KDEvent* event);
 
-// Removes and frees the events queued for thread for which match returns true.
+// Removes and frees the events queued for thread for which match returns true,
+// without releasing their payloads (the caller does that if it must).
 // match runs under the queue lock: it may release records but must not post.
 void discardEvents(KDThread* thread, const std::function<bool(const KDEvent&)>& match);
 

@@ -68,7 +68,9 @@ void pumpThread(KDThread* self);
 void fireDueTimers(KDThread* self);
 // Nanoseconds until the thread's next timer is due, or -1 when none (Timers.cpp).
 KDint64 nanosUntilNextTimer(KDThread* self);
-// Frees every event queued for the thread (Events.cpp).
+// Stops the timers of a thread that is ending from firing into it (Timers.cpp).
+void orphanTimersOf(KDThread* thread);
+// Frees every event queued for the thread, payloads included (Events.cpp).
 void discardAllEvents(KDThread* thread);
 // Starts the count behind pal::timerFireCount again (Timers.cpp).
 void resetTimerFireCount();

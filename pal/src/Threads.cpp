@@ -53,6 +53,7 @@ KDThread::~KDThread() {
         std::lock_guard<std::mutex> lock(registryMutex());
         registry().erase(this);
     }
+    pal::detail::orphanTimersOf(this);
     pal::detail::discardAllEvents(this);
     delete lastReturned;
 }

@@ -113,9 +113,11 @@ void removeTimer(KDTimer* timer) {
         std::lock_guard<std::mutex> lock(c.mutex);
         c.timers.erase(std::remove(c.timers.begin(), c.timers.end(), timer), c.timers.end());
     }
-    pal::detail::discardEvents(timer->owner, [timer](const KDEvent& event) {
-        return pal::detail::queuedEventOf(const_cast<KDEvent*>(&event))->timer == timer;
-    });
+    if (timer->owner != nullptr) {
+        pal::detail::discardEvents(timer->owner, [timer](const KDEvent& event) {
+            return pal::detail::queuedEventOf(const_cast<KDEvent*>(&event))->timer == timer;
+        });
+    }
     delete timer;
 }
 
@@ -145,6 +147,18 @@ void fireDueTimers(KDThread* self) {
     }
     for (KDEvent* event : fired) {
         post(self, event);
+    }
+}
+
+void orphanTimersOf(KDThread* thread) {
+    Clock& c = theClock();
+    std::lock_guard<std::mutex> lock(c.mutex);
+    for (KDTimer* timer : c.timers) {
+        if (timer->owner == thread) {
+            // The handle stays valid for a later kdCancelTimer; it just never fires.
+            timer->owner = nullptr;
+            timer->active = false;
+        }
     }
 }
 

@@ -208,3 +208,45 @@ TEST(ThreadsTest, MainThreadIsTheOneThatStarted) {
 }
 
 }  // namespace
+
+namespace {
+
+void ignoreWifiAnswer(const KDEvent*) {}
+
+class UndeliveredPayloadTest : public ::testing::Test {
+protected:
+    void SetUp() override {
+        pal::resetSimulation();
+        pal::useVirtualClock();
+        pal::start();
+        pal::scriptWifiScan(pal::Answer::after(0), {{"00:11:22:33:44:55", "cafe", -60}});
+    }
+    void TearDown() override { pal::shutdown(); }
+    int requester = 0;
+};
+
+TEST_F(UndeliveredPayloadTest, RemovingTheHandlerBeforeCancellingReleasesTheQueuedRecord) {
+    kdInstallCallback(ignoreWifiAnswer, KD_EVENT_WIFI_SCAN_ZVR, &requester);
+    const KDint handle = kdStartWifiScanZVR(&requester);
+    ASSERT_NE(handle, 0);
+    ASSERT_EQ(pal::unreleasedRecords(), 1);
+    // The order a request object uses when it is cancelled: handler first.
+    kdInstallCallback(nullptr, KD_EVENT_WIFI_SCAN_ZVR, &requester);
+    kdCancelWifiScanZVR(handle);
+    EXPECT_EQ(pal::unreleasedRecords(), 0);
+}
+
+TEST_F(UndeliveredPayloadTest, AnAnswerNobodyListensToIsReleasedWhenDropped) {
+    ASSERT_NE(kdStartWifiScanZVR(&requester), 0);
+    kdPumpEvents();
+    EXPECT_EQ(pal::unreleasedRecords(), 0);
+}
+
+TEST_F(UndeliveredPayloadTest, ShutdownReleasesAnswersStillQueued) {
+    ASSERT_NE(kdStartWifiScanZVR(&requester), 0);
+    pal::shutdown();
+    EXPECT_EQ(pal::unreleasedRecords(), 0);
+    pal::start();
+}
+
+}  // namespace
