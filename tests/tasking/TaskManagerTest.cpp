@@ -280,11 +280,14 @@ TEST_F(TaskManagerTest, DestroyedManagerRunsAndNotifiesNothingMore) {
     // Events of a dead manager would land here.
     kdInstallCallback(&countUserEvent, KD_EVENT_USER, nullptr);
     userEventsWithoutBinding = 0;
-    boost::shared_ptr<ProbeTask> finished = probe("finished");
-    manager->schedule(finished, 2);
+    boost::shared_ptr<ProbeTask> earlier = probe("earlier");
+    manager->schedule(earlier, 2);
     boost::shared_ptr<GateTask> running = gate("running");
     manager->schedule(running, 1);
     running->waitUntilRunning();
+    // With no notification outstanding, the running task's end posts one,
+    // which must not outlive the manager.
+    pumpUntilNotified(earlier);
     boost::shared_ptr<ProbeTask> queued = probe("queued");
     manager->schedule(queued, 0);
     boost::weak_ptr<ProbeTask> watchedQueued = queued;
@@ -299,8 +302,8 @@ TEST_F(TaskManagerTest, DestroyedManagerRunsAndNotifiesNothingMore) {
     manager.reset();
     pump();
 
-    EXPECT_EQ((Names{"finished", "running"}), journal.read("run"));
-    EXPECT_TRUE(journal.read("finished").empty());
+    EXPECT_EQ((Names{"earlier", "running"}), journal.read("run"));
+    EXPECT_EQ(Names{"earlier"}, journal.read("finished"));
     EXPECT_TRUE(watchedQueued.expired());
     EXPECT_EQ(1, running.use_count());
     EXPECT_EQ(0, userEventsWithoutBinding);
