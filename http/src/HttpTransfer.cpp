@@ -53,7 +53,9 @@ int codeUnlessOffline(int code) {
     return kdGetNetworkReachabilityStatusZVR() == 0 ? HTTP_OFFLINE_ERROR_CODE : code;
 }
 
-int classify(CURLcode result) {
+// reachedServer: a connection was made, so whatever went wrong came back
+// from the server's side.
+int classify(CURLcode result, bool reachedServer) {
     switch (result) {
         case CURLE_OPERATION_TIMEDOUT:
             return HTTP_TIMEOUT_ERROR_CODE;
@@ -75,8 +77,11 @@ int classify(CURLcode result) {
         case CURLE_HTTP3:
         case CURLE_FILESIZE_EXCEEDED:
             return HTTP_BAD_RESPONSE_ERROR_CODE;
-        case CURLE_URL_MALFORMAT:
         case CURLE_UNSUPPORTED_PROTOCOL:
+            // Said of our URL, or of an answer that is not HTTP/1.x or later
+            // (or of a redirect to another scheme).
+            return reachedServer ? HTTP_BAD_RESPONSE_ERROR_CODE : HTTP_BAD_REQUEST_ERROR_CODE;
+        case CURLE_URL_MALFORMAT:
             return HTTP_BAD_REQUEST_ERROR_CODE;
         case CURLE_SSL_CONNECT_ERROR:
         case CURLE_PEER_FAILED_VERIFICATION:
@@ -252,7 +257,10 @@ void HttpTransfer::complete(CURLcode result) {
         finish(HTTP_FINISHED_OK);
         return;
     }
-    int code = codeUnlessOffline(classify(result));
+    char* serverAddress = nullptr;
+    curl_easy_getinfo(handle, CURLINFO_PRIMARY_IP, &serverAddress);
+    bool reachedServer = serverAddress != nullptr && serverAddress[0] != '\0';
+    int code = codeUnlessOffline(classify(result, reachedServer));
     kdLogFormatMessage("HttpConnection %d: failed with %d: %s", id, code,
                        errorText[0] != '\0' ? errorText : curl_easy_strerror(result));
     finish(code);

@@ -82,7 +82,6 @@ private:
     void reportSent();
     void updateRequestSize();
     void finish(int code);
-    int failureCode(CURLcode result) const;
     boost::shared_ptr<NetworkSpeedCollector> collector() const { return speedCollector.lock(); }
 
     // Fixed at construction.

@@ -40,10 +40,11 @@ protected:
         PalTest::TearDown();
     }
 
+public:
     // Pumps the calling thread's events until condition holds or the bound
     // (a generous wait limit, not a timing expectation) runs out.
-    static bool waitFor(const std::function<bool()>& condition,
-                        std::chrono::milliseconds bound = std::chrono::seconds(10)) {
+    static bool waitForOnThisThread(const std::function<bool()>& condition,
+                                    std::chrono::milliseconds bound = std::chrono::seconds(10)) {
         const auto end = std::chrono::steady_clock::now() + bound;
         while (!condition()) {
             if (std::chrono::steady_clock::now() >= end) {
@@ -52,6 +53,12 @@ protected:
             kdWaitEvent(5 * 1000 * 1000);
         }
         return true;
+    }
+
+protected:
+    static bool waitFor(const std::function<bool()>& condition,
+                        std::chrono::milliseconds bound = std::chrono::seconds(10)) {
+        return waitForOnThisThread(condition, bound);
     }
 
     std::unique_ptr<Network::HttpEngine> engine;

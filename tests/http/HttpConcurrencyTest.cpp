@@ -1,0 +1,155 @@
+#include <string>
+#include <vector>
+
+#include "HttpTest.h"
+
+using Network::HttpRequest;
+using Reply = TestHttpServer::Reply;
+
+namespace {
+
+struct WorkerRun {
+    std::string url;
+    KDThread* thread = nullptr;
+    std::vector<std::string> events;
+    std::vector<KDThread*> callbackThreads;
+    std::string body;
+    bool finished = false;
+};
+
+// The whole life of a connection on a second thread, which pumps its own
+// events.
+void* runOnWorker(void* argument) {
+    WorkerRun* run = static_cast<WorkerRun*>(argument);
+    run->thread = kdThreadSelf();
+    Recorder recorder(Recorder::get(run->url));
+    recorder.start();
+    run->finished = HttpTest::waitForOnThisThread([&] { return recorder.finished(); });
+    run->events = recorder.events;
+    run->callbackThreads = recorder.threads;
+    run->body = recorder.body;
+    return nullptr;
+}
+
+}  // namespace
+
+class HttpConcurrencyTest : public HttpTest {};
+
+TEST_F(HttpConcurrencyTest, CallbacksRunOnTheStartingThreadWhenItIsNotTheMainThread) {
+    Reply reply;
+    reply.body = "for the worker";
+    server->on("/work", reply);
+    WorkerRun run;
+    run.url = server->url("/work");
+
+    KDThread* worker = kdThreadCreate(nullptr, &runOnWorker, &run);
+    ASSERT_NE(nullptr, worker);
+    kdThreadJoin(worker, nullptr);
+
+    ASSERT_TRUE(run.finished);
+    EXPECT_EQ((std::vector<std::string>{"response", "body", "finished"}), run.events);
+    EXPECT_EQ("for the worker", run.body);
+    for (KDThread* thread : run.callbackThreads) {
+        EXPECT_EQ(run.thread, thread);
+    }
+}
+
+TEST_F(HttpConcurrencyTest, TwoHundredConcurrentConnectionsEachFinishExactlyOnce) {
+    TestHttpServer::Options options;
+    options.keepAliveMaxCount = 1;
+    server.reset(new TestHttpServer(options));
+    const int count = 200;
+    std::vector<std::unique_ptr<Recorder> > recorders;
+    for (int i = 0; i < count; ++i) {
+        Reply reply;
+        reply.body = "item " + std::to_string(i);
+        server->on("/item/" + std::to_string(i), reply);
+        recorders.emplace_back(new Recorder(Recorder::get(server->url("/item/" + std::to_string(i)), 30000)));
+    }
+
+    for (const std::unique_ptr<Recorder>& recorder : recorders) {
+        recorder->start();
+    }
+    auto allFinished = [&] {
+        for (const std::unique_ptr<Recorder>& recorder : recorders) {
+            if (!recorder->finished()) {
+                return false;
+            }
+        }
+        return true;
+    };
+    ASSERT_TRUE(waitFor(allFinished, std::chrono::seconds(60)));
+    Recorder probe(Recorder::get(server->url("/item/0")));
+    probe.start();
+    ASSERT_TRUE(waitFor([&] { return probe.finished(); }));
+
+    for (int i = 0; i < count; ++i) {
+        EXPECT_EQ(1, recorders[i]->finishCount) << i;
+        EXPECT_EQ(0, recorders[i]->code) << i;
+        EXPECT_EQ("item " + std::to_string(i), recorders[i]->body) << i;
+    }
+}
+
+TEST_F(HttpConcurrencyTest, SpeedCollectorSeesSentChunksAndFinishWithTheirSizes) {
+    Reply echo;
+    echo.mode = Reply::Echo;
+    server->on("/echo", echo);
+    const std::string payload(300 * 1024, 'p');
+    boost::shared_ptr<HttpRequest> request =
+        HttpRequest::create(server->url("/echo?x=1").c_str(), "POST", 10000, false);
+    request->getBodyStream()->write(payload.data(), static_cast<unsigned int>(payload.size()));
+    request->getBodyStream()->closeWrite();
+    boost::shared_ptr<RecordingCollector> collector = boost::make_shared<RecordingCollector>();
+    Recorder recorder(request, true, collector, 77);
+
+    recorder.start();
+    ASSERT_TRUE(waitFor([&] { return recorder.finished(); }));
+
+    std::vector<RecordingCollector::Report> reports = collector->reports();
+    ASSERT_GE(reports.size(), 3u);
+    EXPECT_EQ("sent", reports.front().kind);
+    EXPECT_EQ("/echo", reports.front().path);
+    EXPECT_GT(reports.front().size, static_cast<long long>(payload.size()));
+    EXPECT_EQ("finished", reports.back().kind);
+    long long received = 0;
+    int chunks = 0;
+    for (const RecordingCollector::Report& report : reports) {
+        EXPECT_EQ(77, report.id);
+        if (report.kind == "chunk") {
+            received += report.size;
+            ++chunks;
+        }
+    }
+    EXPECT_EQ(static_cast<long long>(payload.size()), received);
+    EXPECT_GT(chunks, 1);
+    EXPECT_EQ(1, collector->count("sent"));
+    EXPECT_EQ(1, collector->count("finished"));
+    EXPECT_EQ(0, collector->count("canceled"));
+    EXPECT_GE(recorder.connection->getRequestSize(), reports.front().size);
+}
+
+TEST_F(HttpConcurrencyTest, CancelIsReportedToTheCollectorAndAGoneCollectorToNobody) {
+    Reply stall;
+    stall.mode = Reply::StallBeforeReply;
+    server->on("/stall", stall);
+    boost::shared_ptr<RecordingCollector> collector = boost::make_shared<RecordingCollector>();
+    Recorder cancelled(Recorder::get(server->url("/stall")), true, collector, 8);
+    boost::shared_ptr<RecordingCollector> gone = boost::make_shared<RecordingCollector>();
+    Reply reply;
+    reply.body = "fine";
+    server->on("/fine", reply);
+    Recorder orphan(Recorder::get(server->url("/fine")), true, gone, 9);
+
+    cancelled.start();
+    ASSERT_TRUE(waitFor([&] { return server->requestCount() == 1; }));
+    cancelled.connection->cancel();
+    ASSERT_TRUE(waitFor([&] { return collector->count("canceled") == 1; }));
+    gone.reset();
+    orphan.start();
+    ASSERT_TRUE(waitFor([&] { return orphan.finished(); }));
+
+    EXPECT_EQ(0, collector->count("finished"));
+    EXPECT_TRUE(cancelled.events.empty());
+    EXPECT_EQ(0, orphan.code);
+    EXPECT_EQ("fine", orphan.body);
+}
