@@ -280,6 +280,9 @@ TEST_F(TaskManagerTest, DestroyedManagerRunsAndNotifiesNothingMore) {
     // Events of a dead manager would land here.
     kdInstallCallback(&countUserEvent, KD_EVENT_USER, nullptr);
     userEventsWithoutBinding = 0;
+    // Holds the queued task back whenever the worker gets free, so that it is
+    // still queued when the destruction begins.
+    manager->enableLowProirityMode();
     boost::shared_ptr<ProbeTask> earlier = probe("earlier");
     manager->schedule(earlier, 2);
     boost::shared_ptr<GateTask> running = gate("running");
@@ -337,13 +340,15 @@ TEST_F(TaskManagerTest, ProcessWideManagerRunsTasksUntilPlatformShutdown) {
     shared->schedule(task, 0);
     pumpUntilNotified(task);
 
+    shared->enableLowProirityMode();
     boost::shared_ptr<GateTask> running = gate("running");
-    shared->schedule(running, 0);
+    shared->schedule(running, 1);
     boost::shared_ptr<ProbeTask> queued = probe("queued");
     shared->schedule(queued, 0);
     running->waitUntilRunning();
     Helper opener([&running] { running->open(); });
     shutdownPal();
+    EXPECT_EQ(Names{"task"}, journal.read("finished"));
     EXPECT_EQ((Names{"task", "running"}), journal.read("run"));
     EXPECT_EQ(1, queued.use_count());
 }
