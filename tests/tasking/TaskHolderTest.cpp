@@ -62,29 +62,22 @@ TEST_F(TaskHolderTest, WaitRunsAndNotifiesTheTask) {
     EXPECT_EQ((Names{"task", "next"}), journal.read("finished"));
 }
 
-TEST_F(TaskHolderTest, CancelledTaskNeverRuns) {
+TEST_F(TaskHolderTest, CancelledOrDestroyedWithCancelOnDestroyRunsNothing) {
     boost::shared_ptr<GateTask> blocker = occupyWorker();
-    Tasking::TaskHolder holder(false);
-    boost::shared_ptr<HeldTask> task = held("task", holder);
-    holder.submit(task, 0);
-    holder.cancel();
-    blocker->open();
-    pumpUntil([&blocker] { return blocker->finishedCount > 0; });
-    EXPECT_EQ(Names{"gate"}, journal.read("run"));
-    EXPECT_EQ(1, task.use_count());
-}
-
-TEST_F(TaskHolderTest, DestroyedWithCancelOnDestroyRunsNothing) {
-    boost::shared_ptr<GateTask> blocker = occupyWorker();
-    boost::shared_ptr<ProbeTask> task = boost::make_shared<ProbeTask>(journal, "task");
+    boost::shared_ptr<ProbeTask> cancelled = boost::make_shared<ProbeTask>(journal, "cancelled");
+    boost::shared_ptr<ProbeTask> dropped = boost::make_shared<ProbeTask>(journal, "dropped");
+    Tasking::TaskHolder keeper(false);
+    keeper.submit(cancelled, 0);
+    keeper.cancel();
     {
         Tasking::TaskHolder holder(true);
-        holder.submit(task, 0);
+        holder.submit(dropped, 0);
     }
     blocker->open();
     pumpUntil([&blocker] { return blocker->finishedCount > 0; });
     EXPECT_EQ(Names{"gate"}, journal.read("run"));
-    EXPECT_EQ(1, task.use_count());
+    EXPECT_EQ(1, cancelled.use_count());
+    EXPECT_EQ(1, dropped.use_count());
 }
 
 TEST_F(TaskHolderTest, DestroyedWithoutCancelOnDestroyBlocksUntilTheTaskRan) {

@@ -18,10 +18,6 @@ public:
         std::lock_guard<std::mutex> lock(mutex);
         entries.push_back(entry);
     }
-    std::vector<std::string> read() const {
-        std::lock_guard<std::mutex> lock(mutex);
-        return entries;
-    }
     // The entries of one kind ("run" or "finished"), without the kind.
     std::vector<std::string> read(const std::string& kind) const {
         std::lock_guard<std::mutex> lock(mutex);
