@@ -1,0 +1,191 @@
+#include <tinyxml.h>
+
+#include <string>
+#include <vector>
+
+#include "io/ByteArrayOutputStream.h"
+#include "io/zip/GzipOutputStream.h"
+#include "support/PalTest.h"
+#include "util/SingleTagCollectionHelper.h"
+#include "util/XmlUtils.h"
+
+using Util::XmlUtils;
+
+namespace {
+
+std::vector<unsigned char> bytesOf(const std::string& text) {
+    return std::vector<unsigned char>(text.begin(), text.end());
+}
+
+std::vector<unsigned char> gzipped(const std::string& text) {
+    IO::ByteArrayOutputStream out;
+    {
+        IO::Zip::GzipOutputStream gzip(&out);
+        gzip.write(text.data(), static_cast<int>(text.size()));
+    }
+    return out.getData();
+}
+
+// Records the walk and stops where told to.
+class RecordingHandler : public Util::SingleTagCollectionHelper {
+public:
+    explicit RecordingHandler(bool optional) : SingleTagCollectionHelper(optional) {}
+
+    bool onCollectionTag(const TiXmlElement* element) override {
+        seen.push_back(std::string("collection ") + XmlUtils::getStringAttr(element, "id", "?"));
+        return SingleTagCollectionHelper::onCollectionTag(element);
+    }
+    bool onItemTag(const TiXmlElement* element) override {
+        seen.push_back("item " + XmlUtils::getText(element, ""));
+        return XmlUtils::getText(element, "") != stopAt;
+    }
+
+    std::vector<std::string> seen;
+    std::string stopAt = "none";
+};
+
+class XmlUtilsTest : public PalTest {
+protected:
+    const TiXmlElement* parse(const std::string& text) {
+        EXPECT_TRUE(XmlUtils::load(bytesOf(text), false, doc)) << text;
+        return doc.RootElement();
+    }
+
+    TiXmlDocument doc;
+};
+
+}  // namespace
+
+TEST_F(XmlUtilsTest, LoadsPlainAndGzippedDocuments) {
+    const std::string text = "<?xml version=\"1.0\"?><startup><uuid>abc</uuid></startup>";
+    ASSERT_TRUE(XmlUtils::load(bytesOf(text), false, doc));
+    EXPECT_EQ("abc", XmlUtils::getText(doc.RootElement()->FirstChildElement("uuid"), ""));
+
+    TiXmlDocument fromGzip;
+    ASSERT_TRUE(XmlUtils::load(gzipped(text), true, fromGzip));
+    EXPECT_EQ("abc", XmlUtils::getText(fromGzip.RootElement()->FirstChildElement("uuid"), ""));
+}
+
+TEST_F(XmlUtilsTest, GzippedLoadAcceptsPlainBytes) {
+    ASSERT_TRUE(XmlUtils::load(bytesOf("<a>1</a>"), true, doc));
+    EXPECT_EQ(1, XmlUtils::getValueAsInt(doc.RootElement()));
+}
+
+TEST_F(XmlUtilsTest, LoadReplacesThePreviousDocument) {
+    parse("<first/>");
+    parse("<second/>");
+    EXPECT_EQ(std::string("second"), doc.RootElement()->Value());
+    EXPECT_EQ(nullptr, doc.RootElement()->NextSiblingElement());
+}
+
+TEST_F(XmlUtilsTest, BrokenOrEmptyDocumentsFail) {
+    EXPECT_FALSE(XmlUtils::load(bytesOf(""), false, doc));
+    EXPECT_FALSE(XmlUtils::load(bytesOf("<a><b></a>"), false, doc));
+    EXPECT_FALSE(XmlUtils::load(bytesOf("<a>"), false, doc));
+    std::vector<unsigned char> truncated = gzipped("<a>text</a>");
+    truncated.resize(truncated.size() - 6);
+    EXPECT_FALSE(XmlUtils::load(truncated, true, doc));
+}
+
+TEST_F(XmlUtilsTest, TextGettersFallBackWhenThereIsNoText) {
+    const TiXmlElement* root = parse("<r><n> 42x</n><f>-2.5e1</f><empty/><s>text</s></r>");
+    EXPECT_EQ(42, XmlUtils::getValueAsInt(root->FirstChildElement("n")));
+    EXPECT_FLOAT_EQ(-25.0f, XmlUtils::getValueAsFloat(root->FirstChildElement("f")));
+    EXPECT_EQ(0, XmlUtils::getValueAsInt(root->FirstChildElement("empty")));
+    EXPECT_EQ(0.0f, XmlUtils::getValueAsFloat(root->FirstChildElement("missing")));
+    EXPECT_EQ("fallback", XmlUtils::getText(root->FirstChildElement("empty"), "fallback"));
+    EXPECT_EQ("fallback", XmlUtils::getText(nullptr, "fallback"));
+    EXPECT_EQ("text", XmlUtils::getText(root->FirstChildElement("s"), "fallback"));
+}
+
+TEST_F(XmlUtilsTest, ChildGettersReportMissingChildren) {
+    const TiXmlElement* root = parse("<r><n>-7</n><u>4000000000</u><big>5000000000</big><e/></r>");
+    int number = 99;
+    EXPECT_TRUE(XmlUtils::getChildValueAsInt(root, "n", number));
+    EXPECT_EQ(-7, number);
+    number = 99;
+    EXPECT_FALSE(XmlUtils::getChildValueAsInt(root, "missing", number));
+    EXPECT_EQ(99, number);
+
+    unsigned int unsignedNumber = 5;
+    EXPECT_FALSE(XmlUtils::getChildValueAsUInt(root, "n", unsignedNumber));
+    EXPECT_FALSE(XmlUtils::getChildValueAsUInt(root, "big", unsignedNumber));
+    EXPECT_FALSE(XmlUtils::getChildValueAsUInt(root, "missing", unsignedNumber));
+    EXPECT_EQ(5u, unsignedNumber);
+    EXPECT_TRUE(XmlUtils::getChildValueAsUInt(root, "u", unsignedNumber));
+    EXPECT_EQ(4000000000u, unsignedNumber);
+
+    std::string text = "old";
+    EXPECT_TRUE(XmlUtils::getChildValueAsString(root, "e", text));
+    EXPECT_EQ("", text);
+    text = "old";
+    EXPECT_FALSE(XmlUtils::getChildValueAsString(root, "missing", text));
+    EXPECT_EQ("old", text);
+}
+
+TEST_F(XmlUtilsTest, AttributeGettersUseDefaultsForAbsentValues) {
+    const TiXmlElement* root = parse("<r s=\"v\" i=\"-12\" f=\"2.5\" bad=\"x\"/>");
+    EXPECT_STREQ("v", XmlUtils::getStringAttr(root, "s", "d"));
+    EXPECT_STREQ("d", XmlUtils::getStringAttr(root, "missing", "d"));
+    EXPECT_EQ(-12, XmlUtils::getIntAttr(root, "i", 3));
+    EXPECT_EQ(3, XmlUtils::getIntAttr(root, "missing", 3));
+    EXPECT_EQ(3, XmlUtils::getIntAttr(root, "bad", 3));
+    EXPECT_FLOAT_EQ(2.5f, XmlUtils::getFloatAttr(root, "f", 1.0f));
+    EXPECT_FLOAT_EQ(1.0f, XmlUtils::getFloatAttr(root, "missing", 1.0f));
+    EXPECT_EQ(3, XmlUtils::getIntAttr(nullptr, "i", 3));
+}
+
+TEST_F(XmlUtilsTest, BoolAttributeTruthTable) {
+    const TiXmlElement* root = parse(
+        "<r zero=\"0\" f1=\"false\" f2=\"FALSE\" f3=\"fAlSe\" one=\"1\" t=\"true\" no=\"no\" empty=\"\""
+        " falsy=\"falsey\" zeros=\"00\"/>");
+    for (const char* name : {"zero", "f1", "f2", "f3", "missing"}) {
+        EXPECT_FALSE(XmlUtils::getBoolAttr(root, name)) << name;
+    }
+    for (const char* name : {"one", "t", "no", "empty", "falsy", "zeros"}) {
+        EXPECT_TRUE(XmlUtils::getBoolAttr(root, name)) << name;
+    }
+}
+
+TEST_F(XmlUtilsTest, WalksCollectionsAndItemsInDocumentOrder) {
+    const TiXmlElement* root =
+        parse("<r><other/><hosts id=\"h\"><host>a</host><x>no</x><host>b</host></hosts></r>");
+    RecordingHandler handler(false);
+    EXPECT_TRUE(XmlUtils::parseTagCollections("hosts", "host", root, handler));
+    EXPECT_EQ((std::vector<std::string>{"collection h", "item a", "item b"}), handler.seen);
+}
+
+TEST_F(XmlUtilsTest, AHandlerReturningFalseStopsTheWalk) {
+    const TiXmlElement* root =
+        parse("<r><hosts id=\"h\"><host>a</host><host>b</host><host>c</host></hosts></r>");
+    RecordingHandler handler(false);
+    handler.stopAt = "b";
+    EXPECT_FALSE(XmlUtils::parseTagCollections("hosts", "host", root, handler));
+    EXPECT_EQ((std::vector<std::string>{"collection h", "item a", "item b"}), handler.seen);
+}
+
+TEST_F(XmlUtilsTest, SingleCollectionHelperRefusesASecondCollection) {
+    const TiXmlElement* root =
+        parse("<r><hosts id=\"1\"><host>a</host></hosts><hosts id=\"2\"><host>b</host></hosts></r>");
+    RecordingHandler handler(true);
+    EXPECT_FALSE(XmlUtils::parseTagCollections("hosts", "host", root, handler));
+    EXPECT_EQ((std::vector<std::string>{"collection 1", "item a", "collection 2"}), handler.seen);
+    EXPECT_TRUE(hasLogLine("Several <hosts> tags"));
+}
+
+TEST_F(XmlUtilsTest, MissingCollectionIsAcceptedOnlyWhenOptional) {
+    const TiXmlElement* root = parse("<r><host>a</host></r>");
+    RecordingHandler optional(true);
+    EXPECT_TRUE(XmlUtils::parseTagCollections("hosts", "host", root, optional));
+    RecordingHandler required(false);
+    EXPECT_FALSE(XmlUtils::parseTagCollections("hosts", "host", root, required));
+    EXPECT_TRUE(optional.seen.empty());
+}
+
+TEST_F(XmlUtilsTest, NullParentOrElementIsAProgrammingError) {
+    RecordingHandler handler(true);
+    EXPECT_FALSE(XmlUtils::parseTagCollections("hosts", "host", nullptr, handler));
+    expectAssertion("parent");
+    EXPECT_FALSE(handler.SingleTagCollectionHelper::onCollectionTag(nullptr));
+    expectAssertion("element");
+}
