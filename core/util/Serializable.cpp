@@ -21,7 +21,8 @@ const char kTmpDir[] = "/tmp/";
 // Written through the platform's own calls rather than a stream, because only these report a
 // failed close, which is where a full disk shows up for buffered writes.
 bool writeWholeFile(const std::string& path, const std::vector<unsigned char>& content) {
-    kdMkdirAllZVR(kDataDir);
+    // The name may carry folders of its own.
+    kdMkdirAllZVR(path.substr(0, path.rfind('/') + 1).c_str());
     KDFile* file = kdFopen(path.c_str(), "wb");
     if (!file) {
         return false;
