@@ -11,9 +11,9 @@ namespace Util {
 class Timer {
 public:
     typedef int TimerType;
-    static const TimerType OneShot = KD_TIMER_ONESHOT;
-    static const TimerType PeriodicAverage = KD_TIMER_PERIODIC_AVERAGE;
-    static const TimerType PeriodicMinimum = KD_TIMER_PERIODIC_MINIMUM;
+    static constexpr TimerType OneShot = KD_TIMER_ONESHOT;
+    static constexpr TimerType PeriodicAverage = KD_TIMER_PERIODIC_AVERAGE;
+    static constexpr TimerType PeriodicMinimum = KD_TIMER_PERIODIC_MINIMUM;
 
     explicit Timer(callback<void (*)()> onFired);
     ~Timer();
