@@ -1,5 +1,7 @@
 #include "network/HttpRequest.h"
 
+#include <strings.h>
+
 namespace Network {
 
 namespace {
@@ -34,6 +36,9 @@ void HttpRequest::setBody(const std::string& boundary, const std::string& conten
     KD_ASSERT(!hasLineBreak(boundary));
     fixedBody = true;
     body = content;
+    for (Headers::iterator it = headers.begin(); it != headers.end();) {
+        it = strcasecmp(it->first.c_str(), "Content-Type") == 0 ? headers.erase(it) : it + 1;
+    }
     addHeader("Content-Type", "multipart/form-data; boundary=" + boundary);
 }
 

@@ -10,6 +10,7 @@ namespace {
 
 struct WorkerRun {
     std::string url;
+    boost::shared_ptr<RecordingCollector> collector;
     KDThread* thread = nullptr;
     std::vector<std::string> events;
     std::vector<KDThread*> callbackThreads;
@@ -22,9 +23,13 @@ struct WorkerRun {
 void* runOnWorker(void* argument) {
     WorkerRun* run = static_cast<WorkerRun*>(argument);
     run->thread = kdThreadSelf();
-    Recorder recorder(Recorder::get(run->url));
+    Recorder recorder(Recorder::get(run->url), true, run->collector, 1);
     recorder.start();
     run->finished = HttpTest::waitForOnThisThread([&] { return recorder.finished(); });
+    // The engine reports the finish to the collector after posting it here;
+    // waiting for that report keeps this thread's record alive until the
+    // engine is done with it (the platform layer may still be waking it).
+    HttpTest::waitForOnThisThread([&] { return run->collector->count("finished") == 1; });
     run->events = recorder.events;
     run->callbackThreads = recorder.threads;
     run->body = recorder.body;
@@ -41,6 +46,7 @@ TEST_F(HttpConcurrencyTest, CallbacksRunOnTheStartingThreadWhenItIsNotTheMainThr
     server->on("/work", reply);
     WorkerRun run;
     run.url = server->url("/work");
+    run.collector = boost::make_shared<RecordingCollector>();
 
     KDThread* worker = kdThreadCreate(nullptr, &runOnWorker, &run);
     ASSERT_NE(nullptr, worker);
