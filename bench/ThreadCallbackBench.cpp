@@ -120,9 +120,11 @@ BENCHMARK(BM_BareConditionVariableQueue)->UseRealTime()->Unit(benchmark::kMillis
 class RateReporter : public benchmark::ConsoleReporter {
 public:
     void ReportRuns(const std::vector<Run>& runs) override {
+        // With repetitions, the median overrides the single runs.
         for (const Run& run : runs) {
             auto rate = run.counters.find("items_per_second");
-            if (rate != run.counters.end() && run.run_type == Run::RT_Iteration) {
+            bool median = run.run_type == Run::RT_Aggregate && run.aggregate_name == "median";
+            if (rate != run.counters.end() && (run.run_type == Run::RT_Iteration || median)) {
                 rates[run.run_name.function_name] = rate->second.value;
             }
         }
