@@ -22,8 +22,14 @@ public:
 
 protected:
     Singleton() {}
-    // Cleared here so that a later getInstance() makes a new object.
-    ~Singleton() override { instance = nullptr; }
+    // Cleared here so that a later getInstance() makes a new object. Only when
+    // this is the instance: a class may also be made as a private object (a
+    // separate task manager), whose end must not forget the shared one.
+    ~Singleton() override {
+        if (instance == this) {
+            instance = nullptr;
+        }
+    }
 
 private:
     Singleton(const Singleton&) = delete;

@@ -7,17 +7,6 @@
 
 #include "util/Logger.h"
 
-namespace Util {
-
-template <>
-Singleton<Tasking::TaskManagerImpl>::~Singleton() {
-    if (instance == this) {
-        instance = nullptr;
-    }
-}
-
-}  // namespace Util
-
 namespace Tasking {
 
 TaskManagerImpl::TaskManagerImpl()

@@ -106,12 +106,3 @@ private:
 };
 
 }  // namespace Tasking
-
-namespace Util {
-
-// A manager made by TaskManager::create() is a TaskManagerImpl as well; its end
-// must not clear the process-wide instance.
-template <>
-Singleton<Tasking::TaskManagerImpl>::~Singleton();
-
-}  // namespace Util
