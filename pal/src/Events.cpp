@@ -30,12 +30,22 @@ KDCallbackFunc* findCallback(KDThread* self, const KDEvent& event) {
 }
 
 QueuedEvent* popEvent(KDThread* self) {
-    std::lock_guard<std::mutex> lock(self->queueMutex);
+    {
+        std::lock_guard<std::mutex> lock(self->inFlightMutex);
+        if (!self->inFlight.empty()) {
+            QueuedEvent* queued = self->inFlight.front();
+            self->inFlight.pop_front();
+            return queued;
+        }
+    }
+    std::lock_guard<std::mutex> queueLock(self->queueMutex);
     if (self->queue.empty()) {
         return nullptr;
     }
-    QueuedEvent* queued = self->queue.front();
-    self->queue.pop_front();
+    std::lock_guard<std::mutex> lock(self->inFlightMutex);
+    self->inFlight.swap(self->queue);
+    QueuedEvent* queued = self->inFlight.front();
+    self->inFlight.pop_front();
     return queued;
 }
 
@@ -65,10 +75,8 @@ void freeUndelivered(QueuedEvent* queued) {
     delete queued;
 }
 
-std::vector<QueuedEvent*> takeMatching(KDThread* thread, const std::function<bool(const KDEvent&)>& match) {
-    std::vector<QueuedEvent*> taken;
-    std::lock_guard<std::mutex> lock(thread->queueMutex);
-    auto& queue = thread->queue;
+void takeMatchingFrom(std::deque<QueuedEvent*>& queue, const std::function<bool(const KDEvent&)>& match,
+                      std::vector<QueuedEvent*>& taken) {
     for (auto it = queue.begin(); it != queue.end();) {
         if (match((*it)->event)) {
             taken.push_back(*it);
@@ -77,6 +85,14 @@ std::vector<QueuedEvent*> takeMatching(KDThread* thread, const std::function<boo
             ++it;
         }
     }
+}
+
+std::vector<QueuedEvent*> takeMatching(KDThread* thread, const std::function<bool(const KDEvent&)>& match) {
+    std::vector<QueuedEvent*> taken;
+    std::lock_guard<std::mutex> queueLock(thread->queueMutex);
+    std::lock_guard<std::mutex> lock(thread->inFlightMutex);
+    takeMatchingFrom(thread->inFlight, match, taken);
+    takeMatchingFrom(thread->queue, match, taken);
     return taken;
 }
 
@@ -87,19 +103,24 @@ void discardUndelivered(KDThread* thread, const std::function<bool(const KDEvent
 }
 
 std::size_t queueLength(KDThread* self) {
-    std::lock_guard<std::mutex> lock(self->queueMutex);
-    return self->queue.size();
+    std::lock_guard<std::mutex> queueLock(self->queueMutex);
+    std::lock_guard<std::mutex> lock(self->inFlightMutex);
+    return self->queue.size() + self->inFlight.size();
 }
 
 }  // namespace
 
 void post(KDThread* thread, KDEvent* event) {
     QueuedEvent* queued = queuedEventOf(event);
+    bool wake;
     {
         std::lock_guard<std::mutex> lock(thread->queueMutex);
         thread->queue.push_back(queued);
+        wake = thread->ownerWaiting;
     }
-    thread->queueChanged.notify_one();
+    if (wake) {
+        thread->queueChanged.notify_one();
+    }
 }
 
 void discardEvents(KDThread* thread, const std::function<bool(const KDEvent&)>& match) {
@@ -209,6 +230,7 @@ const KDEvent* kdWaitEvent(KDust timeout) {
         if (!self->queue.empty() || (!forever && kdGetTimeUST() >= deadline)) {
             continue;
         }
+        self->ownerWaiting = true;
         // On the virtual clock a wait ends only by an event or by advanceTime
         // waking every thread; real time plays no part.
         if (wait < 0 || pal::isVirtualClock()) {
@@ -216,6 +238,7 @@ const KDEvent* kdWaitEvent(KDust timeout) {
         } else {
             self->queueChanged.wait_for(lock, std::chrono::nanoseconds(wait));
         }
+        self->ownerWaiting = false;
     }
 }
 

@@ -35,10 +35,17 @@ struct CallbackKeyHash {
 
 // One per thread that has touched the platform layer.
 struct KDThread {
-    // Guards queue; posting threads take it, the owner pops under it.
+    // Posting threads append to queue under queueMutex. The owner moves the
+    // whole queue into inFlight at once and pops from there under its own
+    // lock, which posters never take, so the two sides rarely contend. A
+    // discard takes both locks (queueMutex first) and searches both lists.
     std::mutex queueMutex;
     std::condition_variable queueChanged;
     std::deque<pal::detail::QueuedEvent*> queue;
+    bool ownerWaiting = false;  // guarded by queueMutex; posters notify only then
+    std::mutex inFlightMutex;
+    std::deque<pal::detail::QueuedEvent*> inFlight;
+    std::atomic<int> timerCount{0};  // timers owned; lets a pump skip the timer scan
 
     // Owner-only state: only the thread itself installs and dispatches.
     std::unordered_map<std::pair<KDint, void*>, KDCallbackFunc*, pal::detail::CallbackKeyHash> callbacks;

@@ -12,6 +12,7 @@
 #include <time.h>
 
 #include <algorithm>
+#include <atomic>
 #include <mutex>
 #include <vector>
 
@@ -31,10 +32,12 @@ struct KDTimer {
 
 namespace {
 
+// Writers hold mutex; the two atomics are also read without it, so that
+// reading the time (on every posted call) never waits for the timer list.
 struct Clock {
     std::mutex mutex;
-    bool isVirtual = false;
-    KDust virtualNow = 0;
+    std::atomic<bool> isVirtual{false};
+    std::atomic<KDust> virtualNow{0};
     KDust virtualStart = 0;
     KDtime wallAtStart = 0;
     std::vector<KDTimer*> timers;
@@ -53,7 +56,7 @@ KDust realMonotonicNanos() {
     return static_cast<KDust>(now.tv_sec) * 1000000000ull + static_cast<KDust>(now.tv_nsec);
 }
 
-KDust nowLocked(Clock& c) { return c.isVirtual ? c.virtualNow : realMonotonicNanos(); }
+KDust currentTime(const Clock& c) { return c.isVirtual.load() ? c.virtualNow.load() : realMonotonicNanos(); }
 
 // Moves a fired timer to its next due time; returns the event to post.
 KDEvent* fireLocked(Clock& c, KDTimer* timer, KDust now) {
@@ -102,8 +105,9 @@ KDTimer* addTimer(KDThread* owner, KDint64 interval, KDint mode, void* userptr, 
     timer->action = std::move(action);
     std::lock_guard<std::mutex> lock(c.mutex);
     timer->id = c.nextTimerId++;
-    timer->due = nowLocked(c) + static_cast<KDust>(std::max<KDint64>(interval, 0));
+    timer->due = currentTime(c) + static_cast<KDust>(std::max<KDint64>(interval, 0));
     c.timers.push_back(timer);
+    ++owner->timerCount;
     return timer;
 }
 
@@ -112,6 +116,9 @@ void removeTimer(KDTimer* timer) {
     {
         std::lock_guard<std::mutex> lock(c.mutex);
         c.timers.erase(std::remove(c.timers.begin(), c.timers.end(), timer), c.timers.end());
+        if (timer->owner != nullptr) {
+            --timer->owner->timerCount;
+        }
     }
     if (timer->owner != nullptr) {
         pal::detail::discardEvents(timer->owner, [timer](const KDEvent& event) {
@@ -126,11 +133,14 @@ void removeTimer(KDTimer* timer) {
 namespace pal::detail {
 
 void fireDueTimers(KDThread* self) {
+    if (self->timerCount.load() == 0) {
+        return;
+    }
     Clock& c = theClock();
     std::vector<KDEvent*> fired;
     {
         std::lock_guard<std::mutex> lock(c.mutex);
-        const KDust now = nowLocked(c);
+        const KDust now = currentTime(c);
         std::vector<KDTimer*> due;
         for (KDTimer* timer : c.timers) {
             if (timer->active && timer->owner == self && timer->due <= now) {
@@ -160,16 +170,20 @@ void orphanTimersOf(KDThread* thread) {
             timer->active = false;
         }
     }
+    thread->timerCount.store(0);
 }
 
 KDint64 nanosUntilNextTimer(KDThread* self) {
+    if (self->timerCount.load() == 0) {
+        return -1;
+    }
     Clock& c = theClock();
     std::lock_guard<std::mutex> lock(c.mutex);
     KDTimer* next = earliestDueLocked(c, static_cast<KDust>(-1), self);
     if (next == nullptr) {
         return -1;
     }
-    const KDust now = nowLocked(c);
+    const KDust now = currentTime(c);
     return next->due > now ? static_cast<KDint64>(next->due - now) : 0;
 }
 
@@ -216,11 +230,7 @@ void useRealClock() {
     c.isVirtual = false;
 }
 
-bool isVirtualClock() {
-    Clock& c = theClock();
-    std::lock_guard<std::mutex> lock(c.mutex);
-    return c.isVirtual;
-}
+bool isVirtualClock() { return theClock().isVirtual.load(); }
 
 void advanceTime(KDust nanoseconds) {
     Clock& c = theClock();
@@ -241,9 +251,9 @@ void advanceTime(KDust nanoseconds) {
                 c.virtualNow = target;
                 break;
             }
-            c.virtualNow = std::max(c.virtualNow, timer->due);
+            c.virtualNow = std::max(c.virtualNow.load(), timer->due);
             owner = timer->owner;
-            event = fireLocked(c, timer, c.virtualNow);
+            event = fireLocked(c, timer, c.virtualNow.load());
         }
         detail::post(owner, event);
         if (owner == self) {
@@ -280,11 +290,7 @@ void resetTimerFireCount() {
 
 extern "C" {
 
-KDust kdGetTimeUST(void) {
-    Clock& c = theClock();
-    std::lock_guard<std::mutex> lock(c.mutex);
-    return nowLocked(c);
-}
+KDust kdGetTimeUST(void) { return currentTime(theClock()); }
 
 KDtime kdTime(KDtime* timep) {
     KDtime seconds;
