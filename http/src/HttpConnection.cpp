@@ -70,6 +70,7 @@ void HttpConnection::start() {
     boost::shared_ptr<HttpDeliveryQueue> deliveries = boost::make_shared<HttpDeliveryQueue>(weak_from_this());
     if (!request) {
         deliveries->pushFinished(HTTP_BAD_REQUEST_ERROR_CODE);
+        deliveries->flush();
         return;
     }
     transfer = boost::make_shared<HttpTransfer>(request, id, speedCollector, wholeBody, deliveries,
@@ -77,12 +78,14 @@ void HttpConnection::start() {
     // Offline: the request would only fail, and later; say so at once.
     if (kdGetNetworkReachabilityStatusZVR() == 0) {
         deliveries->pushFinished(HTTP_OFFLINE_ERROR_CODE);
+        deliveries->flush();
         return;
     }
     boost::shared_ptr<HttpEngineCore> core = HttpEngineCore::current();
     KD_ASSERT(core && "an HttpEngine exists");
     if (!core || !transfer->begin(core)) {
         deliveries->pushFinished(HTTP_NO_ENGINE_ERROR_CODE);
+        deliveries->flush();
     }
 }
 

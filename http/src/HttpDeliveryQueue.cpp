@@ -57,14 +57,17 @@ bool HttpDeliveryQueue::isDetached() const {
 
 void HttpDeliveryQueue::push(const Delivery& delivery) {
     kdThreadMutexLock(mutex);
-    if (detached) {
-        kdThreadMutexUnlock(mutex);
-        return;
+    if (!detached) {
+        pending.push_back(delivery);
     }
-    pending.push_back(delivery);
-    // One event drains everything queued until then; the rest ride along.
-    bool needEvent = !eventPosted;
-    eventPosted = true;
+    kdThreadMutexUnlock(mutex);
+}
+
+void HttpDeliveryQueue::flush() {
+    kdThreadMutexLock(mutex);
+    // One event drains everything queued until it is handled.
+    bool needEvent = !detached && !pending.empty() && !eventPosted;
+    eventPosted = eventPosted || needEvent;
     kdThreadMutexUnlock(mutex);
     if (!needEvent) {
         return;

@@ -15,8 +15,12 @@ namespace Network {
 class HttpConnection;
 
 // Carries one connection's results from the engine thread to its caller
-// thread. push and detach may be called from any thread; construction and
-// delivery happen on the caller thread.
+// thread. push, flush and detach may be called from any thread; construction
+// and delivery happen on the caller thread.
+//
+// Pushing only queues; flush wakes the caller thread. The engine flushes once
+// per round of work, so a response, its body and the finish that arrive
+// together cost the caller thread one wake-up, not three.
 //
 // Every wake-up event holds a reference to the queue, so an event queued
 // after a cancel or after the connection went away finds the queue alive and
@@ -39,6 +43,8 @@ public:
     void pushResponse(const boost::shared_ptr<HttpResponse>& response);
     void pushBodyData(const boost::shared_ptr<DataChunk>& chunk);
     void pushFinished(int code);
+    // Posts a wake-up event unless one is on its way or nothing is queued.
+    void flush();
     // Nothing queued or pushed later is delivered any more.
     void detach();
     bool isDetached() const;

@@ -154,6 +154,7 @@ void HttpEngineCore::run() {
         curl_multi_perform(multi, &active);
         completeDoneTransfers();
         expireSilentTransfers();
+        flushRunningTransfers();
         curl_multi_poll(multi, nullptr, 0, pollTimeoutMs(), nullptr);
     }
     failAll(HTTP_NO_ENGINE_ERROR_CODE);
@@ -195,6 +196,7 @@ void HttpEngineCore::startTransfer(const boost::shared_ptr<HttpTransfer>& transf
     CURL* handle = takeHandle();
     if (handle == nullptr) {
         transfer->fail(HTTP_GENERIC_ERROR_CODE);
+        transfer->flushDeliveries();
         return;
     }
     if (!transfer->open(handle)) {
@@ -249,6 +251,12 @@ void HttpEngineCore::expireSilentTransfers() {
     for (const boost::shared_ptr<HttpTransfer>& transfer : expired) {
         transfer->expire();
         detach(transfer);
+    }
+}
+
+void HttpEngineCore::flushRunningTransfers() {
+    for (const auto& entry : running) {
+        entry.second->flushDeliveries();
     }
 }
 

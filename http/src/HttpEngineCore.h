@@ -55,6 +55,7 @@ private:
     void cancelTransfer(const boost::shared_ptr<HttpTransfer>& transfer);
     void completeDoneTransfers();
     void expireSilentTransfers();
+    void flushRunningTransfers();
     int pollTimeoutMs();
     void detach(const boost::shared_ptr<HttpTransfer>& transfer);
     void failAll(int code);

@@ -120,7 +120,8 @@ HttpTransfer::HttpTransfer(const boost::shared_ptr<HttpRequest>& request, int id
       skippingBlock(false),
       responseDelivered(false),
       sentReported(false),
-      finished(false) {
+      finished(false),
+      deliveriesQueued(false) {
     errorText[0] = '\0';
 }
 
@@ -286,7 +287,15 @@ void HttpTransfer::abandon() {
     }
 }
 
+void HttpTransfer::flushDeliveries() {
+    if (deliveriesQueued) {
+        deliveriesQueued = false;
+        deliveries->flush();
+    }
+}
+
 void HttpTransfer::close() {
+    flushDeliveries();
     curl_slist_free_all(headerList);
     headerList = nullptr;
     handle = nullptr;
@@ -352,6 +361,7 @@ void HttpTransfer::headerBlockEnded() {
 void HttpTransfer::deliverResponse() {
     responseDelivered = true;
     deliveries->pushResponse(boost::make_shared<HttpResponse>(statusCode, reasonPhrase, responseHeaders));
+    deliveriesQueued = true;
 }
 
 size_t HttpTransfer::onBodyBytes(char* data, size_t size, size_t count, void* self) {
@@ -375,6 +385,7 @@ size_t HttpTransfer::onBodyBytes(char* data, size_t size, size_t count, void* se
     }
     if (!transfer->wholeBody) {
         transfer->deliveries->pushBodyData(chunk);
+        transfer->deliveriesQueued = true;
         return length;
     }
     if (!transfer->wholeBodyData) {
@@ -455,6 +466,7 @@ void HttpTransfer::finish(int code) {
         }
     }
     deliveries->pushFinished(code);
+    deliveriesQueued = true;
     boost::shared_ptr<NetworkSpeedCollector> target = collector();
     if (target) {
         target->onRequestFinished(id);

@@ -61,7 +61,10 @@ public:
     void expire();
     // The caller cancelled a transfer still running.
     void abandon();
-    // Releases the handle's resources; the handle goes back to the engine.
+    // Wakes the caller thread for what this round of work queued.
+    void flushDeliveries();
+    // Releases the handle's resources and flushes; the handle goes back to
+    // the engine.
     void close();
 
 private:
@@ -112,6 +115,8 @@ private:
     bool responseDelivered;
     bool sentReported;
     bool finished;
+    // Something was pushed to the caller since the last flush.
+    bool deliveriesQueued;
     boost::shared_ptr<DataChunk> wholeBodyData;
 };
 

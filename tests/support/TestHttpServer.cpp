@@ -70,6 +70,9 @@ TestHttpServer::Impl::Impl(const Options& options) {
     server.new_task_queue = [threads] { return new httplib::ThreadPool(threads); };
     server.set_keep_alive_max_count(options.keepAliveMaxCount);
     server.set_keep_alive_timeout(1);
+    // Headers and body leave in separate writes; Nagle would hold the body
+    // back until the client's delayed ACK.
+    server.set_tcp_nodelay(true);
     httplib::Server::Handler handler = [this](const httplib::Request& request, httplib::Response& response) {
         handle(request, response);
     };
