@@ -467,6 +467,8 @@ void HttpTransfer::finish(int code) {
     }
     deliveries->pushFinished(code);
     deliveriesQueued = true;
+    // The caller hears of the finish before the collector does.
+    flushDeliveries();
     boost::shared_ptr<NetworkSpeedCollector> target = collector();
     if (target) {
         target->onRequestFinished(id);

@@ -109,7 +109,9 @@ TEST_F(HttpConcurrencyTest, SpeedCollectorSeesSentChunksAndFinishWithTheirSizes)
     Recorder recorder(request, true, collector, 77);
 
     recorder.start();
-    ASSERT_TRUE(waitFor([&] { return recorder.finished(); }));
+    // The collector hears of the finish from the engine thread, after the
+    // connection does.
+    ASSERT_TRUE(waitFor([&] { return recorder.finished() && collector->count("finished") == 1; }));
 
     std::vector<RecordingCollector::Report> reports = collector->reports();
     ASSERT_GE(reports.size(), 3u);

@@ -1,2 +1,2 @@
-# The tests talk to real cpp-httplib servers on loopback.
+#The tests talk to real cpp - httplib servers on loopback.
 target_link_libraries(${target} PRIVATE mapcore_httplib)
