@@ -10,8 +10,7 @@ class HttpEngineCore;
 // HttpConnection's transfer. Connections work while an engine exists;
 // several engines at once share one thread. Destroying the last one stops
 // the thread, and connections still running finish with
-// HTTP_NO_ENGINE_ERROR_CODE. Create and destroy on one thread, not from a
-// connection's callback.
+// HTTP_NO_ENGINE_ERROR_CODE. Create and destroy on one thread.
 class HttpEngine {
 public:
     HttpEngine();
