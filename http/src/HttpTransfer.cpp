@@ -176,6 +176,8 @@ bool HttpTransfer::open(CURL* curl) {
     curl_easy_setopt(handle, CURLOPT_HEADERDATA, this);
     curl_easy_setopt(handle, CURLOPT_WRITEFUNCTION, &HttpTransfer::onBodyBytes);
     curl_easy_setopt(handle, CURLOPT_WRITEDATA, this);
+    curl_easy_setopt(handle, CURLOPT_PREREQFUNCTION, &HttpTransfer::onConnected);
+    curl_easy_setopt(handle, CURLOPT_PREREQDATA, this);
     setMethodAndBody();
     setHeaders();
     return true;
@@ -299,6 +301,13 @@ void HttpTransfer::close() {
     curl_slist_free_all(headerList);
     headerList = nullptr;
     handle = nullptr;
+}
+
+// The request is about to leave on an open connection: the server's time to
+// answer starts now, not when connecting started.
+int HttpTransfer::onConnected(void* self, char*, char*, int, int) {
+    static_cast<HttpTransfer*>(self)->touch();
+    return CURL_PREREQFUNC_OK;
 }
 
 size_t HttpTransfer::onHeaderLine(char* data, size_t size, size_t count, void* self) {

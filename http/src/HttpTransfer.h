@@ -71,6 +71,8 @@ private:
     HttpTransfer(const HttpTransfer&) = delete;
     HttpTransfer& operator=(const HttpTransfer&) = delete;
 
+    static int onConnected(void* self, char* serverAddress, char* localAddress, int serverPort,
+                           int localPort);
     static size_t onHeaderLine(char* data, size_t size, size_t count, void* self);
     static size_t onBodyBytes(char* data, size_t size, size_t count, void* self);
     static size_t onUploadRead(char* buffer, size_t size, size_t count, void* self);
