@@ -123,6 +123,8 @@ TEST_F(HttpConcurrencyTest, SpeedCollectorSeesSentChunksAndFinishWithTheirSizes)
     int chunks = 0;
     for (const RecordingCollector::Report& report : reports) {
         EXPECT_EQ(77, report.id);
+        // Reports come from the engine thread, never from the caller's.
+        EXPECT_NE(kdThreadSelf(), report.thread);
         if (report.kind == "chunk") {
             received += report.size;
             ++chunks;

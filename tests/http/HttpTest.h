@@ -139,16 +139,17 @@ public:
         int id;
         long long size;    // request size for "sent", bytes for "chunk"
         std::string path;  // for "sent"
+        KDThread* thread;
     };
 
     void onRequestSent(int id, Network::HttpConnection* connection) override {
-        add({"sent", id, connection->getRequestSize(), connection->getRequestPath()});
+        add({"sent", id, connection->getRequestSize(), connection->getRequestPath(), kdThreadSelf()});
     }
-    void onRequestFinished(int id) override { add({"finished", id, 0, ""}); }
+    void onRequestFinished(int id) override { add({"finished", id, 0, "", kdThreadSelf()}); }
     void onDataChunkReceived(int id, Network::DataChunk* chunk) override {
-        add({"chunk", id, static_cast<long long>(chunk->size()), ""});
+        add({"chunk", id, static_cast<long long>(chunk->size()), "", kdThreadSelf()});
     }
-    void onRequestCanceled(int id) override { add({"canceled", id, 0, ""}); }
+    void onRequestCanceled(int id) override { add({"canceled", id, 0, "", kdThreadSelf()}); }
 
     std::vector<Report> reports() const {
         std::lock_guard<std::mutex> lock(mutex);
