@@ -14,3 +14,7 @@ pkg_check_modules(GLES1 REQUIRED IMPORTED_TARGET glesv1_cm)
 pkg_check_modules(EGL REQUIRED IMPORTED_TARGET egl)
 pkg_check_modules(CURL REQUIRED IMPORTED_TARGET libcurl)
 pkg_check_modules(GEOGRAPHICLIB IMPORTED_TARGET geographiclib)
+# cpp-httplib serves the loopback servers of the tests, benchmarks and demo,
+# never the library. Debian ships it compiled, with definitions that change its
+# types, so its users must take those definitions from pkg-config too.
+pkg_check_modules(CPP_HTTPLIB REQUIRED IMPORTED_TARGET cpp-httplib)

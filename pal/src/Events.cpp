@@ -112,15 +112,18 @@ std::size_t queueLength(KDThread* self) {
 
 void post(KDThread* thread, KDEvent* event) {
     QueuedEvent* queued = queuedEventOf(event);
-    bool wake;
     {
         std::lock_guard<std::mutex> lock(thread->queueMutex);
         thread->queue.push_back(queued);
-        wake = thread->ownerWaiting;
+        if (!thread->ownerWaiting) {
+            return;
+        }
+        // Once the owner has taken this event it may end and be joined while
+        // we still signal it; ~KDThread waits for signals in progress.
+        ++thread->signalsInProgress;
     }
-    if (wake) {
-        thread->queueChanged.notify_one();
-    }
+    thread->queueChanged.notify_one();
+    --thread->signalsInProgress;
 }
 
 void discardEvents(KDThread* thread, const std::function<bool(const KDEvent&)>& match) {

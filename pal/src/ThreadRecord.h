@@ -43,6 +43,7 @@ struct KDThread {
     std::condition_variable queueChanged;
     std::deque<pal::detail::QueuedEvent*> queue;
     bool ownerWaiting = false;  // guarded by queueMutex; posters notify only then
+    std::atomic<int> signalsInProgress{0};  // posters between unlocking and notifying
     std::mutex inFlightMutex;
     std::deque<pal::detail::QueuedEvent*> inFlight;
     std::atomic<int> timerCount{0};  // timers owned; lets a pump skip the timer scan

@@ -53,6 +53,12 @@ KDThread::~KDThread() {
         std::lock_guard<std::mutex> lock(registryMutex());
         registry().erase(this);
     }
+    // A poster that has just handed over our last event may still be
+    // signalling us; the condition must outlive that.
+    { std::lock_guard<std::mutex> queueLock(queueMutex); }
+    while (signalsInProgress.load() != 0) {
+        sched_yield();
+    }
     pal::detail::orphanTimersOf(this);
     pal::detail::discardAllEvents(this);
     delete lastReturned;
