@@ -13,13 +13,14 @@
 #include <condition_variable>
 #include <cstdio>
 #include <deque>
-#include <map>
 #include <mutex>
 #include <string>
 #include <thread>
 #include <vector>
 
 #include "tasking/TaskManager.h"
+
+#include "RateReporter.h"
 
 namespace {
 
@@ -124,22 +125,6 @@ void BM_BareWorkerThreadYielding(benchmark::State& state) {
 }
 BENCHMARK(BM_BareWorkerThreadYielding)->UseRealTime()->Unit(benchmark::kMillisecond);
 
-// Keeps each benchmark's rate so that the ratio can be printed at the end.
-class RateReporter : public benchmark::ConsoleReporter {
-public:
-    void ReportRuns(const std::vector<Run>& runs) override {
-        // With repetitions, the median overrides the single runs.
-        for (const Run& run : runs) {
-            auto rate = run.counters.find("items_per_second");
-            bool median = run.run_type == Run::RT_Aggregate && run.aggregate_name == "median";
-            if (rate != run.counters.end() && (run.run_type == Run::RT_Iteration || median)) {
-                rates[run.run_name.function_name] = rate->second.value;
-            }
-        }
-        ConsoleReporter::ReportRuns(runs);
-    }
-    std::map<std::string, double> rates;
-};
 
 }  // namespace
 
@@ -147,9 +132,9 @@ int main(int argc, char** argv) {
     benchmark::Initialize(&argc, argv);
     RateReporter reporter;
     benchmark::RunSpecifiedBenchmarks(&reporter);
-    double ours = reporter.rates["BM_TaskManager"];
-    double bare = reporter.rates["BM_BareWorkerThread"];
-    double bareYielding = reporter.rates["BM_BareWorkerThreadYielding"];
+    double ours = reporter.rate("BM_TaskManager");
+    double bare = reporter.rate("BM_BareWorkerThread");
+    double bareYielding = reporter.rate("BM_BareWorkerThreadYielding");
     if (ours > 0 && bare > 0 && bareYielding > 0) {
         std::printf(
             "TaskManager: %.0f tasks/s; bare worker thread: %.0f tasks/s (ratio %.2f); "

@@ -10,12 +10,13 @@
 #include <cstdio>
 #include <deque>
 #include <functional>
-#include <map>
 #include <mutex>
 #include <string>
 #include <thread>
 
 #include "util/ThreadCallback.h"
+
+#include "RateReporter.h"
 
 namespace {
 
@@ -116,22 +117,6 @@ void BM_BareConditionVariableQueue(benchmark::State& state) {
 }
 BENCHMARK(BM_BareConditionVariableQueue)->UseRealTime()->Unit(benchmark::kMillisecond);
 
-// Keeps each benchmark's rate so that the ratio can be printed at the end.
-class RateReporter : public benchmark::ConsoleReporter {
-public:
-    void ReportRuns(const std::vector<Run>& runs) override {
-        // With repetitions, the median overrides the single runs.
-        for (const Run& run : runs) {
-            auto rate = run.counters.find("items_per_second");
-            bool median = run.run_type == Run::RT_Aggregate && run.aggregate_name == "median";
-            if (rate != run.counters.end() && (run.run_type == Run::RT_Iteration || median)) {
-                rates[run.run_name.function_name] = rate->second.value;
-            }
-        }
-        ConsoleReporter::ReportRuns(runs);
-    }
-    std::map<std::string, double> rates;
-};
 
 }  // namespace
 
@@ -139,8 +124,8 @@ int main(int argc, char** argv) {
     benchmark::Initialize(&argc, argv);
     RateReporter reporter;
     benchmark::RunSpecifiedBenchmarks(&reporter);
-    double ours = reporter.rates["BM_ThreadCallback"];
-    double bare = reporter.rates["BM_BareConditionVariableQueue"];
+    double ours = reporter.rate("BM_ThreadCallback");
+    double bare = reporter.rate("BM_BareConditionVariableQueue");
     if (ours > 0 && bare > 0) {
         std::printf("ThreadCallback: %.0f calls/s, bare condition-variable queue: %.0f calls/s, ratio %.2f\n",
                     ours, bare, ours / bare);

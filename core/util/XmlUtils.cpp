@@ -56,10 +56,15 @@ bool XmlUtils::load(IO::InputStream* stream, TiXmlDocument& doc) {
     if (!stream) {
         return false;
     }
+    // TinyXML steps over a multi-byte UTF-8 sequence by its announced length
+    // even when the text ends inside it, so on broken input it may land up to
+    // three bytes past the terminator before it looks again. The zero padding
+    // keeps every such step inside the buffer and ends the parse there.
+    const int kTerminatorPadding = 8;
     const long long left = stream->available();
-    // One byte stays free for the terminator TinyXML parses up to.
-    const int size = left <= 0 ? 0 : (left >= INT_MAX ? INT_MAX - 1 : static_cast<int>(left));
-    std::vector<char> text(static_cast<size_t>(size) + 1, '\0');
+    const int size = left <= 0 ? 0 : (left >= INT_MAX - kTerminatorPadding ? INT_MAX - kTerminatorPadding
+                                                                            : static_cast<int>(left));
+    std::vector<char> text(static_cast<size_t>(size) + kTerminatorPadding, '\0');
     const int got = size > 0 ? stream->read(text.data(), size) : 0;
     text[got > 0 ? got : 0] = '\0';
     doc.Parse(text.data(), nullptr, TIXML_DEFAULT_ENCODING);

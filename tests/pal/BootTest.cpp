@@ -20,12 +20,20 @@ void record(const char* test, const char* call) {
 
 void initA(void*) { record("order", "init 0"); }
 void shutdownA(void*) { record("order", "shutdown 0"); }
-void shutdownLate(void*) { record("order", "shutdown 3 (added late)"); }
+// Each run adds its own late hook (a fresh userdata), so a repeated run
+// still adds one during shutdown; earlier runs' late hooks stay silent.
+int g_lateHookMarkers[256];
+int g_run = 0;
+void shutdownLate(void* userdata) {
+    if (userdata == &g_lateHookMarkers[g_run % 256]) {
+        record("order", "shutdown 3 (added late)");
+    }
+}
 void initB(void*) { record("order", "init 4"); }
 void shutdownB(void*) { record("order", "shutdown 4"); }
 void shutdownAddingAnother(void*) {
     record("order", "shutdown 1");
-    kdAddPalCallbacksZVR(nullptr, shutdownLate, 3, nullptr);
+    kdAddPalCallbacksZVR(nullptr, shutdownLate, 3, &g_lateHookMarkers[g_run % 256]);
 }
 void initFailing(void*) {
     if (std::string(g_armed) == "exit") {
@@ -39,6 +47,7 @@ TEST(BootTest, HooksStartFromHighestKeyAndShutDownFromLowest) {
     static int userdata = 0;
     g_calls.clear();
     g_armed = "order";
+    ++g_run;
     kdAddPalCallbacksZVR(initA, shutdownA, 10, &userdata);
     kdAddPalCallbacksZVR(initB, shutdownB, 14, &userdata);
     kdAddPalCallbacksZVR(initB, shutdownB, 14, &userdata);  // same hooks again: no effect
