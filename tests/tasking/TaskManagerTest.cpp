@@ -9,8 +9,6 @@
 
 namespace {
 
-typedef std::vector<std::string> Names;
-
 class TaskManagerTest : public PalTest {
 protected:
     void SetUp() override {
@@ -22,25 +20,25 @@ protected:
         PalTest::TearDown();
     }
 
-    boost::shared_ptr<ProbeTask> probe(const std::string& name) {
-        return boost::make_shared<ProbeTask>(journal, name);
+    template <class T = ProbeTask>
+    boost::shared_ptr<T> make(const std::string& name) {
+        return boost::make_shared<T>(journal, name);
     }
-    boost::shared_ptr<GateTask> gate(const std::string& name) {
-        return boost::make_shared<GateTask>(journal, name);
+    // A new task, already scheduled on the given manager (by default the
+    // test's own).
+    template <class T = ProbeTask>
+    boost::shared_ptr<T> scheduled(const std::string& name, int priority,
+                                   Tasking::TaskManager* on = nullptr) {
+        boost::shared_ptr<T> task = make<T>(name);
+        (on != nullptr ? on : manager.get())->schedule(task, priority);
+        return task;
     }
-    // Leaves the worker blocked in a task of its own, so that what the test
-    // schedules next stays queued until the gate opens.
-    boost::shared_ptr<GateTask> occupyWorker() {
-        boost::shared_ptr<GateTask> blocker = gate("gate");
-        manager->schedule(blocker, 1000);
-        blocker->waitUntilRunning();
-        return blocker;
-    }
-    // Once the gate runs, every task scheduled before it has finished and
-    // waits for its notification, as long as the owner does not pump.
-    boost::shared_ptr<GateTask> finishTasksAheadOfAGate() {
-        boost::shared_ptr<GateTask> blocker = gate("gate");
-        manager->schedule(blocker, -1000);
+    // Schedules a gate and returns once it runs. With a high priority it
+    // leaves what the test schedules next queued until it opens; with a low
+    // one, every task scheduled before it has finished and waits for its
+    // notification, as long as the owner does not pump.
+    boost::shared_ptr<GateTask> runGate(int priority) {
+        boost::shared_ptr<GateTask> blocker = scheduled<GateTask>("gate", priority);
         blocker->waitUntilRunning();
         return blocker;
     }
@@ -52,14 +50,6 @@ protected:
     boost::shared_ptr<Tasking::TaskManager> manager;
 };
 
-// Records the scheduling class the worker is in while it runs the task.
-class PolicyProbe : public Tasking::Task {
-public:
-    void run() override { kdThreadGetSchedParamZVR(kdThreadSelf(), &policy, &param); }
-    KDint policy = -1;
-    KDint param = -1;
-};
-
 int userEventsWithoutBinding = 0;
 void countUserEvent(const KDEvent*) {
     ++userEventsWithoutBinding;
@@ -68,13 +58,9 @@ void countUserEvent(const KDEvent*) {
 }  // namespace
 
 TEST_F(TaskManagerTest, RunsHighestPriorityFirstAndInSchedulingOrderWithinOne) {
-    boost::shared_ptr<GateTask> blocker = occupyWorker();
-    std::vector<boost::shared_ptr<ProbeTask> > tasks = {probe("first"), probe("second"), probe("third"),
-                                                        probe("fourth")};
-    manager->schedule(tasks[0], 0);
-    manager->schedule(tasks[1], 5);
-    manager->schedule(tasks[2], 0);
-    manager->schedule(tasks[3], 5);
+    boost::shared_ptr<GateTask> blocker = runGate(1000);
+    const std::vector<boost::shared_ptr<ProbeTask> > tasks = {scheduled("first", 0), scheduled("second", 5),
+                                                              scheduled("third", 0), scheduled("fourth", 5)};
     blocker->open();
     pumpUntilNotified(tasks[2]);
 
@@ -88,104 +74,64 @@ TEST_F(TaskManagerTest, RunsHighestPriorityFirstAndInSchedulingOrderWithinOne) {
     EXPECT_NE(kdThreadSelf(), blocker->runThread);
 }
 
-TEST_F(TaskManagerTest, NotifiedTaskCanBeScheduledAgain) {
-    boost::shared_ptr<ProbeTask> task = probe("task");
-    manager->schedule(task, 0);
-    pumpUntilNotified(task);
-    manager->schedule(task, 0);
-    pumpUntil([&task] { return task->finishedCount == 2; });
-    EXPECT_EQ((Names{"task", "task"}), journal.read("run"));
-}
-
-TEST_F(TaskManagerTest, LowPriorityModeHoldsBackUnprioritisedTasksUntilAnUrgentOneArrives) {
+TEST_F(TaskManagerTest, LowPriorityModeBacksTheWorkerAndHoldsBackUnprioritisedTasksUntilItEnds) {
+    // Switched at once, before the new worker may even have started: what is
+    // restored must still be the class it was created with.
     manager->enableLowProirityMode();
-    boost::shared_ptr<ProbeTask> idle = probe("idle");
-    boost::shared_ptr<ProbeTask> alsoIdle = probe("alsoIdle");
-    boost::shared_ptr<ProbeTask> urgent = probe("urgent");
-    manager->schedule(idle, 0);
-    manager->schedule(alsoIdle, -3);
-    manager->schedule(urgent, 1);
+    boost::shared_ptr<ProbeTask> idle = scheduled("idle", 0);
+    boost::shared_ptr<ProbeTask> alsoIdle = scheduled("alsoIdle", -3);
+    boost::shared_ptr<ProbeTask> urgent = scheduled("urgent", 1);
     pumpUntilNotified(urgent);
     // The worker took the urgent task and went back to waiting; the others
     // would have run by now only if they had run before it.
     EXPECT_EQ(Names{"urgent"}, journal.read("run"));
+    EXPECT_EQ(KD_THREAD_POLICY_BACKGROUND_ZVR, urgent->runPolicy);
+    EXPECT_EQ(0, urgent->runParam);
 
     manager->disableLowPriorityMode();
     pumpUntilNotified(alsoIdle);
     EXPECT_EQ((Names{"urgent", "idle", "alsoIdle"}), journal.read("run"));
-}
-
-TEST_F(TaskManagerTest, LowPriorityModeMovesTheWorkerToTheBackgroundClassAndBack) {
-    // Switched at once, before the new worker may even have started: what is
-    // restored must still be the class it was created with.
-    manager->enableLowProirityMode();
-    boost::shared_ptr<PolicyProbe> duringMode = boost::make_shared<PolicyProbe>();
-    manager->schedule(duringMode, 1);
-    manager->wait(duringMode, false);
-    EXPECT_EQ(KD_THREAD_POLICY_BACKGROUND_ZVR, duringMode->policy);
-    EXPECT_EQ(0, duringMode->param);
-
-    manager->disableLowPriorityMode();
-    boost::shared_ptr<PolicyProbe> afterMode = boost::make_shared<PolicyProbe>();
-    manager->schedule(afterMode, 0);
-    manager->wait(afterMode, false);
-    EXPECT_EQ(KD_THREAD_POLICY_NORMAL_ZVR, afterMode->policy);
+    EXPECT_EQ(KD_THREAD_POLICY_NORMAL_ZVR, idle->runPolicy);
 }
 
 TEST_F(TaskManagerTest, WaitInLowPriorityModeRunsTheHeldBackTaskInsteadOfBlockingForever) {
     manager->enableLowProirityMode();
-    boost::shared_ptr<ProbeTask> earlier = probe("earlier");
-    boost::shared_ptr<ProbeTask> waited = probe("waited");
-    boost::shared_ptr<ProbeTask> later = probe("later");
-    manager->schedule(earlier, 0);
-    manager->schedule(waited, 0);
-    manager->schedule(later, 0);
+    scheduled("earlier", 0);
+    boost::shared_ptr<ProbeTask> waited = scheduled("waited", 0);
+    scheduled("later", 0);
     manager->wait(waited, true);
     EXPECT_EQ(1, waited->finishedCount);
     // Queue order still held, and the mode holds back what comes after.
-    boost::shared_ptr<ProbeTask> marker = probe("marker");
-    manager->schedule(marker, 1);
+    boost::shared_ptr<ProbeTask> marker = scheduled("marker", 1);
     pumpUntilNotified(marker);
     EXPECT_EQ((Names{"earlier", "waited", "marker"}), journal.read("run"));
     EXPECT_EQ((Names{"waited", "earlier", "marker"}), journal.read("finished"));
-    EXPECT_EQ(1, waited->finishedCount);
 }
 
-TEST_F(TaskManagerTest, CancelledQueuedTaskNeverRuns) {
-    boost::shared_ptr<GateTask> blocker = occupyWorker();
-    boost::shared_ptr<ProbeTask> cancelled = probe("cancelled");
-    boost::shared_ptr<ProbeTask> kept = probe("kept");
-    manager->schedule(cancelled, 0);
-    manager->schedule(kept, 0);
-    manager->cancel(cancelled);
+TEST_F(TaskManagerTest, CancelledQueuedOrFinishedTaskIsNeitherRunNorNotified) {
+    boost::shared_ptr<ProbeTask> finished = scheduled("finished", 0);
+    boost::shared_ptr<GateTask> blocker = runGate(-1000);
+    boost::shared_ptr<ProbeTask> queued = scheduled("queued", 0);
+    boost::shared_ptr<ProbeTask> kept = scheduled("kept", 0);
+    manager->cancel(finished);
+    manager->cancel(queued);
     blocker->open();
     pumpUntilNotified(kept);
-    EXPECT_EQ((Names{"gate", "kept"}), journal.read("run"));
-    EXPECT_EQ(1, cancelled.use_count());
-}
-
-TEST_F(TaskManagerTest, CancelledFinishedTaskIsNotNotified) {
-    boost::shared_ptr<ProbeTask> cancelled = probe("cancelled");
-    manager->schedule(cancelled, 0);
-    boost::shared_ptr<GateTask> blocker = finishTasksAheadOfAGate();
-    manager->cancel(cancelled);
-    blocker->open();
-    pumpUntilNotified(blocker);
-    EXPECT_EQ((Names{"cancelled", "gate"}), journal.read("run"));
-    EXPECT_EQ(Names{"gate"}, journal.read("finished"));
-    EXPECT_EQ(1, cancelled.use_count());
+    EXPECT_EQ((Names{"finished", "gate", "kept"}), journal.read("run"));
+    EXPECT_EQ((Names{"gate", "kept"}), journal.read("finished"));
+    EXPECT_EQ(1, finished.use_count());
+    EXPECT_EQ(1, queued.use_count());
 }
 
 TEST_F(TaskManagerTest, CancelledRunningTaskCompletesUnnotifiedAndIsReleasedOnTheOwnerThread) {
-    boost::shared_ptr<GateTask> running = gate("running");
+    boost::shared_ptr<GateTask> running = make<GateTask>("running");
     KDThread* releasedOn = nullptr;
     running->onDestroyed = [&releasedOn] { releasedOn = kdThreadSelf(); };
     manager->schedule(running, 0);
     running->waitUntilRunning();
     manager->cancel(running);
     boost::weak_ptr<GateTask> watched = running;
-    boost::shared_ptr<ProbeTask> marker = probe("marker");
-    manager->schedule(marker, 0);
+    boost::shared_ptr<ProbeTask> marker = scheduled("marker", 0);
     running->open();
     running.reset();
     pumpUntilNotified(marker);
@@ -197,14 +143,11 @@ TEST_F(TaskManagerTest, CancelledRunningTaskCompletesUnnotifiedAndIsReleasedOnTh
 }
 
 TEST_F(TaskManagerTest, WaitForAQueuedTaskRunsEverythingAheadOfIt) {
-    boost::shared_ptr<ProbeTask> ahead = probe("ahead");
-    boost::shared_ptr<ProbeTask> waited = probe("waited");
-    boost::shared_ptr<ProbeTask> behind = probe("behind");
-    manager->schedule(ahead, 1);
-    manager->schedule(waited, 0);
-    manager->schedule(behind, 0);
+    scheduled("ahead", 1);
+    boost::shared_ptr<ProbeTask> waited = scheduled("waited", 0);
+    boost::shared_ptr<ProbeTask> behind = scheduled("behind", 0);
     manager->wait(waited, false);
-    Names runs = journal.read("run");
+    const Names runs = journal.read("run");
     ASSERT_GE(runs.size(), 2u);
     EXPECT_EQ((Names{"ahead", "waited"}), Names(runs.begin(), runs.begin() + 2));
 
@@ -213,39 +156,38 @@ TEST_F(TaskManagerTest, WaitForAQueuedTaskRunsEverythingAheadOfIt) {
     EXPECT_EQ(0, waited->finishedCount);
 }
 
-TEST_F(TaskManagerTest, WaitWithNotifyOnAFinishedTaskNotifiesExactlyOnce) {
-    boost::shared_ptr<ProbeTask> waited = probe("waited");
-    manager->schedule(waited, 0);
-    boost::shared_ptr<GateTask> blocker = finishTasksAheadOfAGate();
+TEST_F(TaskManagerTest, WaitWithNotifyOnAFinishedTaskNotifiesExactlyOnceAndFreesItForScheduling) {
+    boost::shared_ptr<ProbeTask> waited = scheduled("waited", 0);
+    boost::shared_ptr<GateTask> blocker = runGate(-1000);
     manager->wait(waited, true);
     EXPECT_EQ(1, waited->finishedCount);
     EXPECT_EQ(kdThreadSelf(), waited->finishedThread);
-
     blocker->open();
     pumpUntilNotified(blocker);
     EXPECT_EQ(1, waited->finishedCount);
+
+    manager->schedule(waited, 0);
+    pumpUntil([&waited] { return waited->finishedCount == 2; });
+    EXPECT_EQ((Names{"waited", "gate", "waited"}), journal.read("run"));
 }
 
 TEST_F(TaskManagerTest, WaitForTheRunningTaskReturnsOnceItHasRun) {
-    boost::shared_ptr<GateTask> running = occupyWorker();
+    boost::shared_ptr<GateTask> running = runGate(1000);
     Helper opener([&running] { running->open(); });
     manager->wait(running, true);
     EXPECT_EQ(1, running->finishedCount);
-    EXPECT_EQ(Names{"gate"}, journal.read("run"));
 }
 
 TEST_F(TaskManagerTest, CancellingOrWaitingForATaskTheManagerDoesNotHoldIsAnAssertion) {
-    boost::shared_ptr<ProbeTask> neverScheduled = probe("neverScheduled");
+    boost::shared_ptr<ProbeTask> neverScheduled = make("neverScheduled");
     manager->cancel(neverScheduled);
     expectAssertion("state != nullptr");
     manager->wait(neverScheduled, true);
     expectAssertion("state != nullptr");
 
     boost::shared_ptr<Tasking::TaskManager> other = Tasking::TaskManager::create();
-    boost::shared_ptr<GateTask> elsewhere = gate("elsewhere");
-    other->schedule(elsewhere, 0);
-    boost::shared_ptr<ProbeTask> queuedElsewhere = probe("queuedElsewhere");
-    other->schedule(queuedElsewhere, 0);
+    boost::shared_ptr<GateTask> elsewhere = scheduled<GateTask>("elsewhere", 0, other.get());
+    boost::shared_ptr<ProbeTask> queuedElsewhere = scheduled("queuedElsewhere", 0, other.get());
     manager->cancel(queuedElsewhere);
     expectAssertion("taskState->manager == this");
     manager->wait(queuedElsewhere, false);
@@ -254,8 +196,7 @@ TEST_F(TaskManagerTest, CancellingOrWaitingForATaskTheManagerDoesNotHoldIsAnAsse
     other->wait(queuedElsewhere, false);
     EXPECT_EQ((Names{"elsewhere", "queuedElsewhere"}), journal.read("run"));
 
-    boost::shared_ptr<ProbeTask> notified = probe("notified");
-    manager->schedule(notified, 0);
+    boost::shared_ptr<ProbeTask> notified = scheduled("notified", 0);
     pumpUntilNotified(notified);
     manager->cancel(notified);
     expectAssertion("queued || finished");
@@ -265,13 +206,12 @@ TEST_F(TaskManagerTest, CancellingOrWaitingForATaskTheManagerDoesNotHoldIsAnAsse
 }
 
 TEST_F(TaskManagerTest, WaitingForACancelledRunningTaskIsAnAssertionAndReturns) {
-    boost::shared_ptr<GateTask> running = occupyWorker();
+    boost::shared_ptr<GateTask> running = runGate(1000);
     manager->cancel(running);
     manager->wait(running, true);
     expectAssertion("!currentTaskAborted");
     running->open();
-    boost::shared_ptr<ProbeTask> marker = probe("marker");
-    manager->schedule(marker, 0);
+    boost::shared_ptr<ProbeTask> marker = scheduled("marker", 0);
     pumpUntilNotified(marker);
     EXPECT_EQ(0, running->finishedCount);
 }
@@ -283,43 +223,30 @@ TEST_F(TaskManagerTest, DestroyedManagerRunsAndNotifiesNothingMore) {
     // Holds the queued task back whenever the worker gets free, so that it is
     // still queued when the destruction begins.
     manager->enableLowProirityMode();
-    boost::shared_ptr<ProbeTask> earlier = probe("earlier");
-    manager->schedule(earlier, 2);
-    boost::shared_ptr<GateTask> running = gate("running");
-    manager->schedule(running, 1);
+    boost::shared_ptr<ProbeTask> earlier = scheduled("earlier", 2);
+    boost::shared_ptr<GateTask> running = scheduled<GateTask>("running", 1);
     running->waitUntilRunning();
     // With no notification outstanding, the running task's end posts one,
     // which must not outlive the manager.
     pumpUntilNotified(earlier);
-    boost::shared_ptr<ProbeTask> queued = probe("queued");
-    manager->schedule(queued, 0);
-    boost::weak_ptr<ProbeTask> watchedQueued = queued;
-    queued.reset();
+    const boost::weak_ptr<ProbeTask> queued = scheduled("queued", 0);
 
-    Signal destroying;
-    Helper opener([&] {
-        destroying.waitRaised();
-        running->open();
-    });
-    destroying.raise();
+    Helper opener([&running] { running->open(); });
     manager.reset();
     pump();
 
     EXPECT_EQ((Names{"earlier", "running"}), journal.read("run"));
     EXPECT_EQ(Names{"earlier"}, journal.read("finished"));
-    EXPECT_TRUE(watchedQueued.expired());
+    EXPECT_TRUE(queued.expired());
     EXPECT_EQ(1, running.use_count());
     EXPECT_EQ(0, userEventsWithoutBinding);
     kdInstallCallback(nullptr, KD_EVENT_USER, nullptr);
 }
 
 TEST_F(TaskManagerTest, ManagerDestroyedInANotificationNotifiesNoMore) {
-    boost::shared_ptr<ProbeTask> first = probe("first");
-    boost::shared_ptr<ProbeTask> second = probe("second");
-    boost::shared_ptr<ProbeTask> last = probe("last");
-    manager->schedule(first, 0);
-    manager->schedule(second, 0);
-    manager->schedule(last, 0);
+    boost::shared_ptr<ProbeTask> first = scheduled("first", 0);
+    boost::shared_ptr<ProbeTask> second = scheduled("second", 0);
+    boost::shared_ptr<ProbeTask> last = scheduled("last", 0);
     manager->wait(last, false);
     first->onFinishedHook = [this] { manager.reset(); };
     pumpUntil([this] { return !manager; });
@@ -328,23 +255,16 @@ TEST_F(TaskManagerTest, ManagerDestroyedInANotificationNotifiesNoMore) {
     EXPECT_EQ(1, second.use_count());
 }
 
-TEST_F(TaskManagerTest, SeparateManagerLeavesTheProcessWideOneInPlace) {
+TEST_F(TaskManagerTest, ProcessWideManagerOutlivesSeparateOnesAndRunsTasksUntilPlatformShutdown) {
     Tasking::TaskManager* shared = Tasking::TaskManager::getInstance();
     manager.reset();
     EXPECT_EQ(shared, Tasking::TaskManager::getInstance());
-}
-
-TEST_F(TaskManagerTest, ProcessWideManagerRunsTasksUntilPlatformShutdown) {
-    Tasking::TaskManager* shared = Tasking::TaskManager::getInstance();
-    boost::shared_ptr<ProbeTask> task = probe("task");
-    shared->schedule(task, 0);
+    boost::shared_ptr<ProbeTask> task = scheduled("task", 0, shared);
     pumpUntilNotified(task);
 
     shared->enableLowProirityMode();
-    boost::shared_ptr<GateTask> running = gate("running");
-    shared->schedule(running, 1);
-    boost::shared_ptr<ProbeTask> queued = probe("queued");
-    shared->schedule(queued, 0);
+    boost::shared_ptr<GateTask> running = scheduled<GateTask>("running", 1, shared);
+    boost::shared_ptr<ProbeTask> queued = scheduled("queued", 0, shared);
     running->waitUntilRunning();
     Helper opener([&running] { running->open(); });
     shutdownPal();

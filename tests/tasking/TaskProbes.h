@@ -1,42 +1,59 @@
 #pragma once
 
 #include <KD/kd.h>
+#include <KD/kdext.h>
 
-#include <boost/shared_ptr.hpp>
 #include <condition_variable>
 #include <functional>
+#include <map>
 #include <mutex>
 #include <string>
 #include <vector>
 
 #include "tasking/Task.h"
 
-// What the tasks of one test did, in order, from any thread.
+typedef std::vector<std::string> Names;
+
+// The names of the tasks that ran ("run", on the worker) and were notified
+// ("finished", on the owner), in order; any thread.
 class Journal {
 public:
-    void add(const std::string& entry) {
+    void add(const std::string& kind, const std::string& name) {
         std::lock_guard<std::mutex> lock(mutex);
-        entries.push_back(entry);
+        entries[kind].push_back(name);
     }
-    // The entries of one kind ("run" or "finished"), without the kind.
-    std::vector<std::string> read(const std::string& kind) const {
+    Names read(const std::string& kind) const {
         std::lock_guard<std::mutex> lock(mutex);
-        std::vector<std::string> names;
-        for (const std::string& entry : entries) {
-            if (entry.compare(0, kind.size() + 1, kind + " ") == 0) {
-                names.push_back(entry.substr(kind.size() + 1));
-            }
-        }
-        return names;
+        const auto found = entries.find(kind);
+        return found == entries.end() ? Names() : found->second;
     }
 
 private:
     mutable std::mutex mutex;
-    std::vector<std::string> entries;
+    std::map<std::string, Names> entries;
 };
 
-// Writes "run <name>" on the worker and "finished <name>" on the owner, and
-// remembers the threads and counts.
+// A flag one thread raises and another waits for.
+class Signal {
+public:
+    void raise() {
+        std::lock_guard<std::mutex> lock(mutex);
+        raised = true;
+        changed.notify_all();
+    }
+    void waitRaised() {
+        std::unique_lock<std::mutex> lock(mutex);
+        changed.wait(lock, [this] { return raised; });
+    }
+
+private:
+    std::mutex mutex;
+    std::condition_variable changed;
+    bool raised = false;
+};
+
+// Journals its run and notification and remembers the threads, the worker's
+// scheduling class during the run, and the count of notifications.
 class ProbeTask : public Tasking::Task {
 public:
     ProbeTask(Journal& journal, const std::string& name) : journal(journal), name(name) {}
@@ -48,12 +65,13 @@ public:
 
     void run() override {
         runThread = kdThreadSelf();
-        journal.add("run " + name);
+        kdThreadGetSchedParamZVR(runThread, &runPolicy, &runParam);
+        journal.add("run", name);
     }
     void onFinished() override {
         finishedThread = kdThreadSelf();
         ++finishedCount;
-        journal.add("finished " + name);
+        journal.add("finished", name);
         if (onFinishedHook) {
             onFinishedHook();
         }
@@ -63,6 +81,8 @@ public:
     const std::string name;
     KDThread* runThread = nullptr;
     KDThread* finishedThread = nullptr;
+    KDint runPolicy = -1;
+    KDint runParam = -1;
     int finishedCount = 0;
     std::function<void()> onFinishedHook;
     std::function<void()> onDestroyed;
@@ -72,31 +92,19 @@ public:
 // test decides what is queued, running or finished.
 class GateTask : public ProbeTask {
 public:
-    GateTask(Journal& journal, const std::string& name) : ProbeTask(journal, name) {}
+    using ProbeTask::ProbeTask;
 
     void run() override {
         ProbeTask::run();
-        std::unique_lock<std::mutex> lock(mutex);
-        started = true;
-        changed.notify_all();
-        changed.wait(lock, [this] { return opened; });
+        started.raise();
+        opened.waitRaised();
     }
-
-    void waitUntilRunning() {
-        std::unique_lock<std::mutex> lock(mutex);
-        changed.wait(lock, [this] { return started; });
-    }
-    void open() {
-        std::lock_guard<std::mutex> lock(mutex);
-        opened = true;
-        changed.notify_all();
-    }
+    void waitUntilRunning() { started.waitRaised(); }
+    void open() { opened.raise(); }
 
 private:
-    std::mutex mutex;
-    std::condition_variable changed;
-    bool started = false;
-    bool opened = false;
+    Signal started;
+    Signal opened;
 };
 
 // Pumps the calling thread's events until done() holds. Blocks while nothing
@@ -123,23 +131,4 @@ private:
 
     std::function<void()> body;
     KDThread* thread;
-};
-
-// A flag one thread raises and another waits for.
-class Signal {
-public:
-    void raise() {
-        std::lock_guard<std::mutex> lock(mutex);
-        raised = true;
-        changed.notify_all();
-    }
-    void waitRaised() {
-        std::unique_lock<std::mutex> lock(mutex);
-        changed.wait(lock, [this] { return raised; });
-    }
-
-private:
-    std::mutex mutex;
-    std::condition_variable changed;
-    bool raised = false;
 };
