@@ -4,24 +4,20 @@
 
 #include "HttpTest.h"
 
-using Reply = TestHttpServer::Reply;
-
 class HttpCancelTest : public HttpTest {
 protected:
     void SetUp() override {
         HttpTest::SetUp();
-        Reply probe;
-        probe.body = "probe";
-        server->on("/probe", probe);
+        probeUrl = serve("/probe", Reply::Whole, "probe");
+        halfUrl = serve("/half", Reply::StallMidBody, std::string(64 * 1024, 'b'));
     }
 
     // Another exchange run to its end: whatever the engine had for the
     // connection under test has reached this thread's queue by then and has
     // been pumped.
     void pumpThroughAProbe() {
-        Recorder probe(Recorder::get(server->url("/probe")));
-        probe.start();
-        ASSERT_TRUE(waitFor([&] { return probe.finished(); }));
+        Recorder probe(Recorder::get(probeUrl));
+        ASSERT_TRUE(Recorder::runAll({&probe}));
     }
 
     // Waits without pumping: the engine thread queues, this thread does not
@@ -36,11 +32,23 @@ protected:
         }
         return true;
     }
+
+    // Runs `action` after the recorder noted `event`.
+    static void onEvent(Recorder& recorder, const std::string& event, const std::function<void()>& action) {
+        recorder.afterEvent = [event, action](const std::string& noted) {
+            if (noted == event) {
+                action();
+            }
+        };
+    }
+
+    std::string probeUrl;
+    std::string halfUrl;
+    boost::shared_ptr<RecordingCollector> collector = boost::make_shared<RecordingCollector>();
 };
 
 TEST_F(HttpCancelTest, CancelBeforeStartRunsNothingAndSendsNothing) {
-    boost::shared_ptr<RecordingCollector> collector = boost::make_shared<RecordingCollector>();
-    Recorder recorder(Recorder::get(server->url("/probe")), true, collector, 1);
+    Recorder recorder(Recorder::get(probeUrl), true, collector, 1);
 
     recorder.connection->cancel();
     recorder.start();
@@ -52,17 +60,8 @@ TEST_F(HttpCancelTest, CancelBeforeStartRunsNothingAndSendsNothing) {
 }
 
 TEST_F(HttpCancelTest, CancelDuringTheBodyStopsEveryLaterCallback) {
-    Reply stall;
-    stall.mode = Reply::StallMidBody;
-    stall.body = std::string(64 * 1024, 'b');
-    server->on("/half", stall);
-    boost::shared_ptr<RecordingCollector> collector = boost::make_shared<RecordingCollector>();
-    Recorder recorder(Recorder::get(server->url("/half")), false, collector, 2);
-    recorder.afterEvent = [&](const std::string& event) {
-        if (event == "body") {
-            recorder.connection->cancel();
-        }
-    };
+    Recorder recorder(Recorder::get(halfUrl), false, collector, 2);
+    onEvent(recorder, "body", [&] { recorder.connection->cancel(); });
 
     recorder.start();
     ASSERT_TRUE(waitFor([&] { return collector->count("canceled") == 1; }));
@@ -74,17 +73,13 @@ TEST_F(HttpCancelTest, CancelDuringTheBodyStopsEveryLaterCallback) {
 }
 
 TEST_F(HttpCancelTest, CancelInsideTheFinishedCallbackIsSafe) {
-    boost::shared_ptr<RecordingCollector> collector = boost::make_shared<RecordingCollector>();
-    Recorder recorder(Recorder::get(server->url("/probe")), true, collector, 3);
-    recorder.afterEvent = [&](const std::string& event) {
-        if (event == "finished") {
-            recorder.connection->cancel();
-            recorder.connection->cancel();
-        }
-    };
+    Recorder recorder(Recorder::get(probeUrl), true, collector, 3);
+    onEvent(recorder, "finished", [&] {
+        recorder.connection->cancel();
+        recorder.connection->cancel();
+    });
 
-    recorder.start();
-    ASSERT_TRUE(waitFor([&] { return recorder.finished(); }));
+    ASSERT_TRUE(Recorder::runAll({&recorder}));
     pumpThroughAProbe();
 
     EXPECT_EQ((std::vector<std::string>{"response", "body", "finished"}), recorder.events);
@@ -93,8 +88,7 @@ TEST_F(HttpCancelTest, CancelInsideTheFinishedCallbackIsSafe) {
 }
 
 TEST_F(HttpCancelTest, CancelWithEverythingAlreadyQueuedDeliversNothing) {
-    boost::shared_ptr<RecordingCollector> collector = boost::make_shared<RecordingCollector>();
-    Recorder recorder(Recorder::get(server->url("/probe")), false, collector, 4);
+    Recorder recorder(Recorder::get(probeUrl), false, collector, 4);
 
     recorder.start();
     // The engine has queued response, body and finish for this thread.
@@ -105,34 +99,10 @@ TEST_F(HttpCancelTest, CancelWithEverythingAlreadyQueuedDeliversNothing) {
     EXPECT_TRUE(recorder.events.empty());
 }
 
-TEST_F(HttpCancelTest, CancelInsideTheResponseCallbackDropsBodyAndFinish) {
-    Recorder recorder(Recorder::get(server->url("/probe")));
-    recorder.afterEvent = [&](const std::string& event) {
-        if (event == "response") {
-            recorder.connection->cancel();
-        }
-    };
-
-    recorder.start();
-    ASSERT_TRUE(waitFor([&] { return !recorder.events.empty(); }));
-    pumpThroughAProbe();
-
-    EXPECT_EQ((std::vector<std::string>{"response"}), recorder.events);
-}
-
-TEST_F(HttpCancelTest, DroppingTheLastReferenceInsideACallbackEndsTheConnection) {
-    Reply stall;
-    stall.mode = Reply::StallMidBody;
-    stall.body = std::string(64 * 1024, 'c');
-    server->on("/half", stall);
-    boost::shared_ptr<RecordingCollector> collector = boost::make_shared<RecordingCollector>();
-    Recorder recorder(Recorder::get(server->url("/half")), false, collector, 5);
+TEST_F(HttpCancelTest, DroppingTheLastReferenceInsideTheResponseCallbackEndsTheConnection) {
+    Recorder recorder(Recorder::get(halfUrl), false, collector, 5);
     boost::weak_ptr<Network::HttpConnection> watched = recorder.connection;
-    recorder.afterEvent = [&](const std::string& event) {
-        if (event == "response") {
-            recorder.connection.reset();
-        }
-    };
+    onEvent(recorder, "response", [&] { recorder.connection.reset(); });
 
     recorder.start();
     ASSERT_TRUE(waitFor([&] { return collector->count("canceled") == 1; }));

@@ -7,6 +7,7 @@
 #include <boost/shared_ptr.hpp>
 #include <chrono>
 #include <functional>
+#include <initializer_list>
 #include <memory>
 #include <mutex>
 #include <string>
@@ -22,48 +23,19 @@
 #include "support/PalTest.h"
 #include "support/TestHttpServer.h"
 
-// The platform booted on the real clock (network waits are real) with an
-// HttpEngine and a loopback server running for the test.
-class HttpTest : public PalTest {
-protected:
-    void beforePalStart() override { pal::useRealClock(); }
-    void SetUp() override {
-        PalTest::SetUp();
-        engine.reset(new Network::HttpEngine());
-        server.reset(new TestHttpServer());
-    }
-    // The engine goes first: its closed connections let the server's threads
-    // stop at once instead of waiting out keep-alive.
-    void TearDown() override {
-        engine.reset();
-        server.reset();
-        PalTest::TearDown();
-    }
-
-public:
-    // Pumps the calling thread's events until condition holds or the bound
-    // (a generous wait limit, not a timing expectation) runs out.
-    static bool waitForOnThisThread(const std::function<bool()>& condition,
-                                    std::chrono::milliseconds bound = std::chrono::seconds(10)) {
-        const auto end = std::chrono::steady_clock::now() + bound;
-        while (!condition()) {
-            if (std::chrono::steady_clock::now() >= end) {
-                return false;
-            }
-            kdWaitEvent(5 * 1000 * 1000);
+// Pumps the calling thread's events until condition holds or the bound (a
+// generous wait limit, not a timing expectation) runs out.
+inline bool waitFor(const std::function<bool()>& condition,
+                    std::chrono::milliseconds bound = std::chrono::seconds(10)) {
+    const auto end = std::chrono::steady_clock::now() + bound;
+    while (!condition()) {
+        if (std::chrono::steady_clock::now() >= end) {
+            return false;
         }
-        return true;
+        kdWaitEvent(5 * 1000 * 1000);
     }
-
-protected:
-    static bool waitFor(const std::function<bool()>& condition,
-                        std::chrono::milliseconds bound = std::chrono::seconds(10)) {
-        return waitForOnThisThread(condition, bound);
-    }
-
-    std::unique_ptr<Network::HttpEngine> engine;
-    std::unique_ptr<TestHttpServer> server;
-};
+    return true;
+}
 
 // Records what one connection delivers, in order, on the thread that pumps.
 class Recorder {
@@ -84,6 +56,21 @@ public:
 
     static boost::shared_ptr<Network::HttpRequest> get(const std::string& url, int timeoutMs = 10000) {
         return Network::HttpRequest::create(url.c_str(), "GET", timeoutMs, false);
+    }
+
+    // Starts every recorder, then pumps until all have finished.
+    static bool runAll(std::initializer_list<Recorder*> recorders) {
+        for (Recorder* recorder : recorders) {
+            recorder->start();
+        }
+        return waitFor([&] {
+            for (Recorder* recorder : recorders) {
+                if (!recorder->finished()) {
+                    return false;
+                }
+            }
+            return true;
+        });
     }
 
     void start() { connection->start(); }
@@ -171,4 +158,47 @@ private:
 
     mutable std::mutex mutex;
     std::vector<Report> recorded;
+};
+
+// The platform booted on the real clock (network waits are real) with an
+// HttpEngine and a loopback server running for the test.
+class HttpTest : public PalTest {
+protected:
+    typedef TestHttpServer::Reply Reply;
+
+    void beforePalStart() override { pal::useRealClock(); }
+    void SetUp() override {
+        PalTest::SetUp();
+        engine.reset(new Network::HttpEngine());
+        server.reset(new TestHttpServer());
+    }
+    // The engine goes first: its closed connections let the server's threads
+    // stop at once instead of waiting out keep-alive.
+    void TearDown() override {
+        engine.reset();
+        server.reset();
+        PalTest::TearDown();
+    }
+
+    // Scripts the answer for `path` and gives its URL.
+    std::string serve(const std::string& path, Reply::Mode mode, const std::string& body = "",
+                      int status = 200) {
+        Reply reply;
+        reply.mode = mode;
+        reply.body = body;
+        reply.status = status;
+        server->on(path, reply);
+        return server->url(path);
+    }
+
+    // Runs one GET to its end and gives its recorder.
+    static std::unique_ptr<Recorder> fetch(const std::string& url, int timeoutMs = 10000,
+                                           bool wholeBody = true) {
+        std::unique_ptr<Recorder> recorder(new Recorder(Recorder::get(url, timeoutMs), wholeBody));
+        EXPECT_TRUE(Recorder::runAll({recorder.get()}));
+        return recorder;
+    }
+
+    std::unique_ptr<Network::HttpEngine> engine;
+    std::unique_ptr<TestHttpServer> server;
 };
