@@ -5,6 +5,8 @@
 
 #include <boost/make_shared.hpp>
 #include <boost/scoped_ptr.hpp>
+#include <list>
+#include <map>
 #include <string>
 #include <vector>
 
@@ -51,20 +53,10 @@ public:
 
     boost::shared_ptr<Render::Resource> create(const ResourceDesc* desc) override {
         ++created;
-        return boost::make_shared<TestResource>(nameOf(desc) + "#" + std::to_string(created), journal);
+        return boost::make_shared<TestResource>(names[desc] + "#" + std::to_string(created), journal);
     }
 
-    std::string nameOf(const ResourceDesc* desc) const {
-        for (size_t i = 0; i < names.size(); ++i) {
-            if (descs[i] == desc) {
-                return names[i];
-            }
-        }
-        return "?";
-    }
-
-    std::vector<const ResourceDesc*> descs;
-    std::vector<std::string> names;
+    std::map<const ResourceDesc*, std::string> names;
     int created = 0;
 
 private:
@@ -98,8 +90,7 @@ protected:
 
     boost::shared_ptr<ResourceDesc> makeDesc(const std::string& name, ResourceDesc::Usage usage) {
         boost::shared_ptr<ResourceDesc> desc = boost::make_shared<ResourceDesc>(factory, usage);
-        factory->descs.push_back(desc.get());
-        factory->names.push_back(name);
+        factory->names[desc.get()] = name;
         descs.push_back(desc);
         return desc;
     }
@@ -107,11 +98,15 @@ protected:
     // An optional descriptor loaded ahead and queued for caching.
     boost::shared_ptr<ResourceDesc> queueOptional(const std::string& name) {
         boost::shared_ptr<ResourceDesc> desc = makeDesc(name, ResourceDesc::OPTIONAL);
-        notes.push_back(new ReadyNote{&journal, name});
         desc->setResourceManager(manager.get());
         desc->loadResource();
-        desc->cacheResource(ResourceDesc::ReadyCallback::make<&onReady>(), notes.back());
+        cache(desc, name);
         return desc;
+    }
+
+    void cache(const boost::shared_ptr<ResourceDesc>& desc, const std::string& name) {
+        notes.push_back(ReadyNote{&journal, name});
+        desc->cacheResource(ResourceDesc::ReadyCallback::make<&onReady>(), &notes.back());
     }
 
     void frame() {
@@ -120,17 +115,11 @@ protected:
         pump();
     }
 
-    ~ResourceManagerTest() override {
-        for (ReadyNote* note : notes) {
-            delete note;
-        }
-    }
-
     Journal journal;
     boost::shared_ptr<TestFactory> factory;
     boost::scoped_ptr<Render::ResourceManager> manager;
     std::vector<boost::shared_ptr<ResourceDesc> > descs;
-    std::vector<ReadyNote*> notes;
+    std::list<ReadyNote> notes;
 };
 
 TEST_F(ResourceManagerTest, RequiredResourceIsLoadedAndCachedWhenFirstDrawn) {
@@ -150,7 +139,7 @@ TEST_F(ResourceManagerTest, RequiredResourceIsLoadedAndCachedWhenFirstDrawn) {
 }
 
 TEST_F(ResourceManagerTest, OptionalResourcesBecomeReadyOnePerFrameWithCallbacksAfterEachFrame) {
-    queueOptional("a");
+    boost::shared_ptr<ResourceDesc> a = queueOptional("a");
     queueOptional("b");
     queueOptional("c");
     EXPECT_EQ(journal, (Journal{"load a#1", "load b#2", "load c#3"}));
@@ -165,28 +154,10 @@ TEST_F(ResourceManagerTest, OptionalResourcesBecomeReadyOnePerFrameWithCallbacks
                                 "frame", "ready c", "frame"}));
     EXPECT_EQ(manager->getResourceCount(), 3u);
     EXPECT_EQ(manager->getWaitingCount(), 0u);
-}
 
-TEST_F(ResourceManagerTest, ReadyCallbacksNeverRunInsideProcess) {
-    queueOptional("a");
-    queueOptional("b");
+    // Cached ahead, drawn without loading again.
     journal.clear();
-
-    manager->process();
-    manager->process();
-    EXPECT_EQ(journal, (Journal{"cache a#1", "cache b#2"}));
-
-    pump();
-    EXPECT_EQ(journal, (Journal{"cache a#1", "cache b#2", "ready a", "ready b"}));
-}
-
-TEST_F(ResourceManagerTest, CachedOptionalResourceIsDrawnWithoutLoadingAgain) {
-    boost::shared_ptr<ResourceDesc> desc = queueOptional("a");
-    frame();
-    journal.clear();
-
-    boost::shared_ptr<Render::Resource> resource = desc->getResource(manager.get());
-
+    boost::shared_ptr<Render::Resource> resource = a->getResource(manager.get());
     ASSERT_TRUE(resource);
     EXPECT_TRUE(resource->isCached());
     EXPECT_TRUE(journal.empty());
@@ -204,6 +175,13 @@ TEST_F(ResourceManagerTest, CancellingWaitingDescriptorRemovesBothQueueEntries) 
     EXPECT_EQ(journal, (Journal{"cache b#2", "frame", "ready b", "frame"}));
     EXPECT_FALSE(a->isInitialized());
     EXPECT_EQ(manager->getResourceCount(), 1u);
+
+    // A cancelled descriptor may be queued again.
+    journal.clear();
+    a->loadResource();
+    cache(a, "a");
+    frame();
+    EXPECT_EQ(journal, (Journal{"load a#3", "cache a#3", "frame", "ready a"}));
 }
 
 TEST_F(ResourceManagerTest, CancellingReadyDescriptorSchedulesRemovalAndItsCallbackNeverRuns) {
@@ -221,18 +199,6 @@ TEST_F(ResourceManagerTest, CancellingReadyDescriptorSchedulesRemovalAndItsCallb
     EXPECT_EQ(manager->getResourceCount(), 0u);
 }
 
-TEST_F(ResourceManagerTest, CancelledDescriptorCanBeQueuedAgain) {
-    boost::shared_ptr<ResourceDesc> a = queueOptional("a");
-    a->cancelResource();
-    journal.clear();
-
-    a->loadResource();
-    a->cacheResource(ResourceDesc::ReadyCallback::make<&onReady>(), notes.back());
-    frame();
-
-    EXPECT_EQ(journal, (Journal{"load a#2", "cache a#2", "frame", "ready a"}));
-}
-
 TEST_F(ResourceManagerTest, CancellingUnknownDescriptorIsReported) {
     boost::shared_ptr<ResourceDesc> a = queueOptional("a");
     frame();
@@ -245,7 +211,7 @@ TEST_F(ResourceManagerTest, CancellingUnknownDescriptorIsReported) {
     EXPECT_EQ(manager->getResourceCount(), 1u);
 }
 
-TEST_F(ResourceManagerTest, RemovalWaitsForNextProcessAndHappensOnce) {
+TEST_F(ResourceManagerTest, RemovalWaitsForNextProcessAndHappensOnceAndTheDescriptorCanBeDrawnAgain) {
     boost::shared_ptr<ResourceDesc> a = makeDesc("a", ResourceDesc::REQUIRED);
     a->getResource(manager.get());
     journal.clear();
@@ -260,18 +226,9 @@ TEST_F(ResourceManagerTest, RemovalWaitsForNextProcessAndHappensOnce) {
     EXPECT_EQ(journal, (Journal{"clear a#1"}));
     EXPECT_EQ(manager->getResourceCount(), 0u);
     EXPECT_EQ(manager->getRemoveCount(), 0u);
-}
 
-TEST_F(ResourceManagerTest, ShutDownDescriptorCanBeDrawnAgainWithFreshResource) {
-    boost::shared_ptr<ResourceDesc> a = makeDesc("a", ResourceDesc::REQUIRED);
-    a->getResource(manager.get());
-    a->shutdownResource();
-    manager->process();
     journal.clear();
-
-    boost::shared_ptr<Render::Resource> resource = a->getResource(manager.get());
-
-    ASSERT_TRUE(resource);
+    ASSERT_TRUE(a->getResource(manager.get()));
     EXPECT_EQ(journal, (Journal{"load a#2", "cache a#2"}));
 }
 
@@ -353,8 +310,7 @@ TEST_F(ResourceManagerTest, OptionalResourceLoadedOnWorkerThreadIsCachedOnMainTh
     kdThreadJoin(worker, &result);
     EXPECT_EQ(result, a.get());
 
-    notes.push_back(new ReadyNote{&journal, "a"});
-    a->cacheResource(ResourceDesc::ReadyCallback::make<&onReady>(), notes.back());
+    cache(a, "a");
     frame();
 
     EXPECT_EQ(journal, (Journal{"load a#1", "cache a#1", "frame", "ready a"}));
