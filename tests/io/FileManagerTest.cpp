@@ -56,51 +56,37 @@ protected:
 
 }  // namespace
 
-TEST_F(FileManagerTest, ResourceFilesAreThoseStartingWithRes) {
-    EXPECT_TRUE(FileManager::isResourceFile("/res/a.png"));
-    EXPECT_TRUE(FileManager::isResourceFile("/resx"));
-    EXPECT_TRUE(FileManager::isResourceFile("/resources/x"));
-    EXPECT_FALSE(FileManager::isResourceFile("/data/x"));
-    EXPECT_FALSE(FileManager::isResourceFile("/re"));
-    expectAssertion("kdStrlen(aFileName) >= 4");
-}
-
-TEST_F(FileManagerTest, PlainFilesOpenForWritingAndReading) {
+TEST_F(FileManagerTest, PlainFilesOpenForWritingAndReadingButNotResourcePaths) {
     boost::shared_ptr<IO::OutputStream> out = FileManager::openOutput("/data/settings/s.bin");
     ASSERT_TRUE(out);
     out->writeString("saved");
     out.reset();
     boost::shared_ptr<IO::InputStream> in = FileManager::openInput("/data/settings/s.bin");
-    ASSERT_TRUE(in);
     std::string text;
-    EXPECT_TRUE(in->readString(text));
+    EXPECT_TRUE(in && in->readString(text));
     EXPECT_EQ("saved", text);
     EXPECT_FALSE(FileManager::openInput("/data/none"));
     EXPECT_TRUE(logLines().empty());
-}
 
-TEST_F(FileManagerTest, ResourcePathsAreNotForPlainOpening) {
+    EXPECT_TRUE(FileManager::isResourceFile("/resx"));
+    EXPECT_FALSE(FileManager::isResourceFile("/re"));
+    expectAssertion("kdStrlen(aFileName) >= 4");
     FileManager::openInput("/res/a.png");
     expectAssertion("!isResourceFile(aFileName)");
     FileManager::openOutput("/res/a.png");
     expectAssertion("!isResourceFile(aFileName)");
 }
 
-TEST_F(FileManagerTest, ResourcesComeFromThePackageNamedByThePlatform) {
-    writePackage("/res/app.pak");
-    init();
-    EXPECT_EQ(png, readResource("a.png"));
-    EXPECT_EQ(big, readResource("big.bin"));
-    EXPECT_FALSE(FileManager::openInputRes("missing.png"));
-    EXPECT_TRUE(hasLogLine("File missing.png not found in resource"));
-}
-
-TEST_F(FileManagerTest, AFileInDataOverridesTheResource) {
+TEST_F(FileManagerTest, ResourcesComeFromThePackageNamedByThePlatformUnlessDataOverridesThem) {
     writePackage("/res/app.pak");
     writeFile("/data/a.png", bytesOf("override"));
     init();
     EXPECT_EQ(bytesOf("override"), readResource("a.png"));
     EXPECT_EQ(big, readResource("big.bin"));
+    EXPECT_FALSE(FileManager::openInputRes("missing.png"));
+    EXPECT_TRUE(hasLogLine("File missing.png not found in resource"));
+    kdRemove("/data/a.png");
+    EXPECT_EQ(png, readResource("a.png"));
 }
 
 TEST_F(FileManagerTest, NestedInitialisationsKeepThePackageOpenUntilTheLastShutdown) {
@@ -162,7 +148,7 @@ TEST_F(FileManagerTest, ResourcesOpenAndReadOnSeveralThreadsAtOnce) {
     EXPECT_EQ(20, matches[1]);
 }
 
-TEST_F(FileManagerTest, ScanDirectoryAppendsMatchingFilesDepthFirst) {
+TEST_F(FileManagerTest, ScanDirectoryAppendsMatchingFilesDepthFirstAndLeavesTheOutputAloneForAMissingFolder) {
     writeFile("/data/scan/a.png", Bytes());
     writeFile("/data/scan/b.txt", Bytes());
     writeFile("/data/scan/sub/c.png", Bytes());
@@ -180,11 +166,9 @@ TEST_F(FileManagerTest, ScanDirectoryAppendsMatchingFilesDepthFirst) {
     std::vector<std::string> longSuffix;
     FileManager::scanDirectory("/data/scan", longSuffix, "a-suffix-longer-than-any-path-in-here.png", true);
     EXPECT_TRUE(longSuffix.empty());
-}
 
-TEST_F(FileManagerTest, ScanningAMissingFolderLogsAndLeavesTheOutputAlone) {
-    std::vector<std::string> out = {"kept"};
+    const std::vector<std::string> before = out;
     FileManager::scanDirectory("/data/none", out, nullptr, true);
-    EXPECT_EQ(std::vector<std::string>{"kept"}, out);
+    EXPECT_EQ(before, out);
     EXPECT_TRUE(hasLogLine("FileManager::scanDirectory()[could not open dir]"));
 }

@@ -18,6 +18,9 @@ protected:
     // size bytes that differ from block to block, so a misplaced block shows.
     static Bytes pattern(size_t size, unsigned int seed = 1);
     static Bytes bytesOf(const std::string& text) { return Bytes(text.begin(), text.end()); }
+    static Bytes slice(const Bytes& data, size_t at, size_t length) {
+        return Bytes(data.begin() + at, data.begin() + at + length);
+    }
 
     // Reads until the stream delivers nothing more.
     static Bytes readAll(IO::InputStream& stream);

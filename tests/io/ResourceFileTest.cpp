@@ -61,158 +61,126 @@ protected:
         return resource->openInputStream(name, index);
     }
 
+    // A package of the one resource "X" holding thousand.
+    void buildPackage(unsigned int blockSize, bool compressed) {
+        PackageBuilder builder(package, blockSize);
+        EXPECT_TRUE(builder.addResource("X", thousand.data(), thousand.size(), compressed));
+    }
+    boost::shared_ptr<IO::Resource::FileSystem> index() {
+        return ResourceFile::createFileSystem(packageStream());
+    }
+
     Bytes thousand = pattern(1000, 7);
+};
+
+// A block stream over thousand in blocks of 400 bytes, served from memory.
+class BlockStreamTest : public ResourceFileTest {
+protected:
+    BlockSource source{thousand, 400};
+    BlockInputStream stream{source.opener(), 1000, 400};
+    std::vector<unsigned int>& opened = source.opened;
+
+    Bytes read(long long at, int length) {
+        stream.seek(at, KD_SEEK_SET);
+        Bytes bytes(length);
+        EXPECT_EQ(length, stream.read(bytes.data(), length)) << at;
+        return bytes;
+    }
 };
 
 }  // namespace
 
-TEST_F(ResourceFileTest, ABlockStreamOpensEveryBlockItReadsInOrder) {
-    BlockSource source(thousand, 400);
-    BlockInputStream stream(source.opener(), 1000, 400);
-    Bytes all(1000);
-    EXPECT_EQ(1000, stream.read(all.data(), 1000));
-    EXPECT_EQ(thousand, all);
-    EXPECT_EQ((std::vector<unsigned int>{0, 1, 2}), source.opened);
+TEST_F(BlockStreamTest, OpensOnlyTheBlocksAReadTouchesAndNothingOnASeek) {
+    stream.seek(850, KD_SEEK_SET);
+    EXPECT_TRUE(opened.empty());
+    EXPECT_EQ(slice(thousand, 850, 150), read(850, 150));
+    EXPECT_EQ((std::vector<unsigned int>{2}), opened);
+    EXPECT_EQ(slice(thousand, 300, 100), read(300, 100));
+    EXPECT_EQ(slice(thousand, 350, 100), read(350, 100));
+    EXPECT_EQ((std::vector<unsigned int>{2, 0, 1}), opened);
+    EXPECT_EQ(thousand, read(0, 1000));
     EXPECT_EQ(0, stream.available());
 }
 
-TEST_F(ResourceFileTest, ASeekOpensNothingAndAReadOpensOnlyTheBlocksItTouches) {
-    BlockSource source(thousand, 400);
-    BlockInputStream stream(source.opener(), 1000, 400);
-    stream.seek(850, KD_SEEK_SET);
-    EXPECT_TRUE(source.opened.empty());
-    Bytes tail(150);
-    EXPECT_EQ(150, stream.read(tail.data(), 150));
-    EXPECT_EQ(Bytes(thousand.begin() + 850, thousand.end()), tail);
-    EXPECT_EQ((std::vector<unsigned int>{2}), source.opened);
-
-    stream.seek(-700, KD_SEEK_CUR);
-    Bytes across(100);
-    EXPECT_EQ(100, stream.read(across.data(), 100));
-    EXPECT_EQ(Bytes(thousand.begin() + 300, thousand.begin() + 400), across);
-    stream.seek(350, KD_SEEK_SET);
-    EXPECT_EQ(100, stream.read(across.data(), 100));
-    EXPECT_EQ(Bytes(thousand.begin() + 350, thousand.begin() + 450), across);
-    EXPECT_EQ((std::vector<unsigned int>{2, 0, 1}), source.opened);
-}
-
-TEST_F(ResourceFileTest, ReadingPastTheEndReturnsShortWithoutTouchingAFurtherBlock) {
-    BlockSource source(thousand, 400);
-    BlockInputStream stream(source.opener(), 1000, 400);
+TEST_F(BlockStreamTest, ReadsAndSeeksPastTheEndStopThereWithoutTouchingAFurtherBlock) {
     stream.seek(-10, KD_SEEK_END);
     Bytes buffer(50);
     EXPECT_EQ(10, stream.read(buffer.data(), 50));
-    EXPECT_EQ(Bytes(thousand.end() - 10, thousand.end()), Bytes(buffer.begin(), buffer.begin() + 10));
+    EXPECT_EQ(slice(thousand, 990, 10), slice(buffer, 0, 10));
     EXPECT_EQ(0, stream.read(buffer.data(), 50));
-    EXPECT_EQ((std::vector<unsigned int>{2}), source.opened);
-}
-
-TEST_F(ResourceFileTest, SeekingABlockStreamIsClampedToTheResource) {
-    BlockSource source(thousand, 400);
-    BlockInputStream stream(source.opener(), 1000, 400);
+    EXPECT_EQ((std::vector<unsigned int>{2}), opened);
     stream.seek(-5, KD_SEEK_SET);
     EXPECT_EQ(0, stream.tell());
     stream.seek(5000, KD_SEEK_CUR);
     EXPECT_EQ(1000, stream.tell());
-    EXPECT_EQ(0, stream.available());
 }
 
-TEST_F(ResourceFileTest, AMissingBlockEndsTheReadShort) {
-    BlockSource source(thousand, 400);
+TEST_F(BlockStreamTest, AMissingBlockEndsTheReadShortAndALongOneLendsNoBytes) {
     source.missing = 1;
-    BlockInputStream stream(source.opener(), 1000, 400);
     Bytes all(1000);
     EXPECT_EQ(400, stream.read(all.data(), 1000));
     EXPECT_EQ(400, stream.tell());
-}
 
-TEST_F(ResourceFileTest, ABlockLongerThanTheBlockSizeDoesNotLendItsBytesToTheNext) {
-    BlockSource source(thousand, 400);
-    source.extraBytes = 50;
-    BlockInputStream stream(source.opener(), 1000, 400);
-    Bytes all(1000);
-    EXPECT_EQ(1000, stream.read(all.data(), 1000));
+    // A damaged package could serve blocks longer than the block size.
+    BlockSource longBlocks(thousand, 400);
+    longBlocks.extraBytes = 50;
+    BlockInputStream fromLongBlocks(longBlocks.opener(), 1000, 400);
+    EXPECT_EQ(1000, fromLongBlocks.read(all.data(), 1000));
     EXPECT_EQ(thousand, all);
 }
 
-TEST_F(ResourceFileTest, ASplitResourceReadsBackThroughItsParts) {
-    {
-        PackageBuilder builder(package, 400);
-        EXPECT_TRUE(builder.addResource("X", thousand.data(), thousand.size(), true));
-    }
-    boost::shared_ptr<IO::Resource::FileSystem> index = ResourceFile::createFileSystem(packageStream());
-    ASSERT_TRUE(index);
-    boost::shared_ptr<IO::InputStream> stream = openResource("X", index);
+TEST_F(ResourceFileTest, ASplitResourceReadsBackThroughItsPartsWithOrWithoutAPreparedIndex) {
+    buildPackage(400, true);
+    ASSERT_TRUE(index());
+    boost::shared_ptr<IO::InputStream> stream = openResource("X", index());
     ASSERT_TRUE(dynamic_cast<IO::Resource::ResBlockInputStream*>(stream.get()));
     EXPECT_EQ(1000, stream->available());
     stream->seek(850, KD_SEEK_SET);
-    Bytes tail(150);
-    EXPECT_EQ(150, stream->read(tail.data(), 150));
-    EXPECT_EQ(Bytes(thousand.begin() + 850, thousand.end()), tail);
+    EXPECT_EQ(slice(thousand, 850, 150), readAll(*stream));
     stream->seek(0, KD_SEEK_SET);
+    EXPECT_EQ(thousand, readAll(*stream));
+
+    stream = openResource("X", boost::shared_ptr<IO::Resource::FileSystem>());
+    ASSERT_TRUE(stream);
     EXPECT_EQ(thousand, readAll(*stream));
 }
 
 TEST_F(ResourceFileTest, StoredPartsShareOnePackageStreamAndStillReadRight) {
-    {
-        PackageBuilder builder(package, 300);
-        EXPECT_TRUE(builder.addResource("X", thousand.data(), thousand.size(), false));
-    }
-    boost::shared_ptr<IO::InputStream> stream =
-        openResource("X", ResourceFile::createFileSystem(packageStream()));
+    buildPackage(300, false);
+    boost::shared_ptr<IO::InputStream> stream = openResource("X", index());
     ASSERT_TRUE(stream);
-    Bytes buffer(10);
+    Bytes buffer(5);
     for (long long at : {995LL, 5LL, 605LL, 295LL, 0LL}) {
         stream->seek(at, KD_SEEK_SET);
-        int count = stream->read(buffer.data(), 5);
-        EXPECT_EQ(5, count) << at;
-        EXPECT_EQ(Bytes(thousand.begin() + at, thousand.begin() + at + 5),
-                  Bytes(buffer.begin(), buffer.begin() + 5));
+        EXPECT_EQ(5, stream->read(buffer.data(), 5)) << at;
+        EXPECT_EQ(slice(thousand, at, 5), buffer) << at;
     }
 }
 
 TEST_F(ResourceFileTest, AResourceNoLargerThanItsBlockIsASingleEntry) {
-    Bytes four = pattern(400, 3);
+    const Bytes four = pattern(400, 3);
     {
         PackageBuilder builder(package, 400);
         EXPECT_TRUE(builder.addResource("X", four.data(), four.size(), true));
         EXPECT_TRUE(builder.addResource("plain", thousand.data(), 0, false));
     }
-    boost::shared_ptr<IO::Resource::FileSystem> index = ResourceFile::createFileSystem(packageStream());
-    boost::shared_ptr<IO::InputStream> stream = openResource("X", index);
+    boost::shared_ptr<IO::InputStream> stream = openResource("X", index());
     ASSERT_TRUE(stream);
     EXPECT_FALSE(dynamic_cast<IO::Resource::ResBlockInputStream*>(stream.get()));
     EXPECT_EQ(four, readAll(*stream));
-    boost::shared_ptr<IO::InputStream> empty = openResource("plain", index);
+    boost::shared_ptr<IO::InputStream> empty = openResource("plain", index());
     ASSERT_TRUE(empty);
     EXPECT_EQ(0, empty->available());
 }
 
-TEST_F(ResourceFileTest, AResourceOpensWithoutAPreparedIndexToo) {
-    {
-        PackageBuilder builder(package, 400);
-        builder.addResource("X", thousand.data(), thousand.size(), true);
-    }
-    boost::shared_ptr<IO::InputStream> stream =
-        openResource("X", boost::shared_ptr<IO::Resource::FileSystem>());
-    ASSERT_TRUE(stream);
-    EXPECT_EQ(thousand, readAll(*stream));
-}
-
-TEST_F(ResourceFileTest, AMissingResourceIsLoggedAndEmpty) {
-    {
-        PackageBuilder builder(package, 0);
-        builder.addResource("X", thousand.data(), thousand.size(), true);
-    }
-    EXPECT_FALSE(openResource("Y", ResourceFile::createFileSystem(packageStream())));
+TEST_F(ResourceFileTest, AMissingResourceOrAnUnreadablePackageIsEmpty) {
+    buildPackage(0, true);
+    EXPECT_FALSE(openResource("Y", index()));
     EXPECT_TRUE(hasLogLine("File Y not found in resource"));
-}
 
-TEST_F(ResourceFileTest, AnUnreadablePackageGivesNoIndex) {
-    Bytes garbage = bytesOf("this is not a zip archive at all");
-    boost::shared_ptr<IO::InputStream> stream =
-        boost::make_shared<IO::ByteArrayInputStream>(garbage.data(), static_cast<int>(garbage.size()));
-    EXPECT_FALSE(ResourceFile::createFileSystem(stream));
+    const Bytes garbage = bytesOf("this is not a zip archive at all");
+    EXPECT_FALSE(ResourceFile::createFileSystem(
+        boost::make_shared<IO::ByteArrayInputStream>(garbage.data(), static_cast<int>(garbage.size()))));
     expectAssertion("false");
 }
 
@@ -241,24 +209,22 @@ protected:
 
 TEST_F(DamagedPackageTest, AMissingPartEndsTheResourceShort) {
     writePackage({0xE8, 0x03, 0, 0, 0x90, 0x01, 0, 0}, false);
-    boost::shared_ptr<IO::InputStream> stream =
-        openResource("X", ResourceFile::createFileSystem(packageStream()));
+    boost::shared_ptr<IO::InputStream> stream = openResource("X", index());
     ASSERT_TRUE(stream);
     Bytes all(1000);
     EXPECT_EQ(800, stream->read(all.data(), 1000));
-    EXPECT_EQ(Bytes(thousand.begin(), thousand.begin() + 800), Bytes(all.begin(), all.begin() + 800));
+    EXPECT_EQ(slice(thousand, 0, 800), slice(all, 0, 800));
     expectAssertion("entry");
 }
 
-TEST_F(DamagedPackageTest, AnExtraFieldOfTheWrongSizeIsRefused) {
+TEST_F(DamagedPackageTest, AnExtraFieldOfTheWrongSizeOrABlockSizeOfZeroIsRefused) {
     writePackage({0xE8, 0x03, 0}, true);
-    EXPECT_FALSE(openResource("X", ResourceFile::createFileSystem(packageStream())));
+    EXPECT_FALSE(openResource("X", index()));
     expectAssertion("entry->extra.size() == sizeof(ExtraField)");
-}
 
-TEST_F(DamagedPackageTest, ABlockSizeOfZeroIsRefused) {
+    package = boost::make_shared<IO::ByteArrayOutputStream>();
     writePackage({0xE8, 0x03, 0, 0, 0, 0, 0, 0}, true);
-    EXPECT_FALSE(openResource("X", ResourceFile::createFileSystem(packageStream())));
+    EXPECT_FALSE(openResource("X", index()));
     expectAssertion("extra.blockSize > 0");
 }
 
@@ -275,7 +241,7 @@ TEST_F(ResourceFileTest, TheBuilderRefusesNamesThatWouldCollide) {
     EXPECT_EQ(5, countLogLines("PackageBuilder:"));
 }
 
-TEST_F(ResourceFileTest, TheBuilderPacksAFolderThatReadsBackByteForByte) {
+TEST_F(ResourceFileTest, TheBuilderPacksAFolderThatReadsBackByteForByteAndTheSameEachTime) {
     Bytes big = pattern(5000, 11);
     Bytes small = bytesOf("small text");
     Bytes image = pattern(700, 12);
@@ -283,15 +249,17 @@ TEST_F(ResourceFileTest, TheBuilderPacksAFolderThatReadsBackByteForByte) {
     writeFile("/data/in/sub/small.txt", small);
     writeFile("/data/in/sub/deeper/image.png", image);
     writeFile("/data/in/empty", Bytes());
-    {
-        PackageBuilder builder(package, 1024);
+    boost::shared_ptr<IO::ByteArrayOutputStream> again = boost::make_shared<IO::ByteArrayOutputStream>();
+    for (const boost::shared_ptr<IO::ByteArrayOutputStream>& out : {package, again}) {
+        PackageBuilder builder(out, 1024);
         EXPECT_EQ(4, builder.addDirectory("/data/in/", true, {".png"}));
     }
-    boost::shared_ptr<IO::Resource::FileSystem> index = ResourceFile::createFileSystem(packageStream());
-    ASSERT_TRUE(index);
+    EXPECT_EQ(package->getData(), again->getData());
+    boost::shared_ptr<IO::Resource::FileSystem> packed = index();
+    ASSERT_TRUE(packed);
     for (auto expected : {std::make_pair("big.bin", big), std::make_pair("sub/small.txt", small),
                           std::make_pair("sub/deeper/image.png", image), std::make_pair("empty", Bytes())}) {
-        boost::shared_ptr<IO::InputStream> stream = openResource(expected.first, index);
+        boost::shared_ptr<IO::InputStream> stream = openResource(expected.first, packed);
         ASSERT_TRUE(stream) << expected.first;
         EXPECT_EQ(expected.second, readAll(*stream)) << expected.first;
     }
@@ -301,18 +269,4 @@ TEST_F(ResourceFileTest, TheBuilderPacksAFolderThatReadsBackByteForByte) {
     EXPECT_TRUE(zip->findEntry("sub/small.txt")->compressed);
     EXPECT_TRUE(zip->findEntry("big.bin.part004"));
     EXPECT_EQ((Bytes{0x88, 0x13, 0, 0, 0, 4, 0, 0}), zip->findEntry("big.bin")->extra);
-}
-
-TEST_F(ResourceFileTest, TheSameFolderAlwaysGivesTheSamePackage) {
-    writeFile("/data/in/b", pattern(100, 1));
-    writeFile("/data/in/a", pattern(100, 2));
-    writeFile("/data/in/c/d", pattern(100, 3));
-    boost::shared_ptr<IO::ByteArrayOutputStream> second = boost::make_shared<IO::ByteArrayOutputStream>();
-    {
-        PackageBuilder first(package, 0);
-        first.addDirectory("/data/in", true, {});
-        PackageBuilder again(second, 0);
-        again.addDirectory("/data/in", true, {});
-    }
-    EXPECT_EQ(package->getData(), second->getData());
 }
