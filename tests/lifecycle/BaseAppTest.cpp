@@ -66,7 +66,7 @@ TEST_F(BaseAppTest, StartCreatesAndInitialisesTheAppAndLogsTheLoadTime) {
     EXPECT_FALSE(pal::exitRequested());
 }
 
-TEST_F(BaseAppTest, AppIsPausedUntilTheFirstResume) {
+TEST_F(BaseAppTest, AppIsPausedUntilTheFirstResumeAndASecondPauseReportsNoChange) {
     TestApp* app = TestApp::get();
     EXPECT_TRUE(app->getIsPaused());
     EXPECT_TRUE(Lifecycle::PauseResumeHandler::getInstance()->getIsAppPaused());
@@ -74,15 +74,11 @@ TEST_F(BaseAppTest, AppIsPausedUntilTheFirstResume) {
     pump();
     EXPECT_FALSE(app->getIsPaused());
     EXPECT_FALSE(Lifecycle::PauseResumeHandler::getInstance()->getIsAppPaused());
-    EXPECT_EQ(std::vector<bool>{true}, app->resumedResults);
-}
 
-TEST_F(BaseAppTest, SecondPauseInARowReportsNoChange) {
-    TestApp* app = TestApp::get();
-    pal::postAppResumed();
     pal::postAppPaused();
     pal::postAppPaused();
     pump();
+    EXPECT_EQ(std::vector<bool>{true}, app->resumedResults);
     EXPECT_EQ((std::vector<bool>{true, false}), app->pausedResults);
     EXPECT_TRUE(app->getIsPaused());
 }
@@ -98,6 +94,7 @@ TEST_F(BaseAppTest, ShutdownUnregistersWhileTheHandlerLivesAndDeletesTheApp) {
     EXPECT_EQ(TestApp::handlerListenersBeforeShutdown - 1, TestApp::handlerListenersAfterShutdown);
     EXPECT_EQ(nullptr, BaseApp::get());
     expectAssertion("app != nullptr");
+    EXPECT_EQ(nullptr, Lifecycle::PauseResumeHandler::getInstance());
 }
 
 TEST_F(BaseAppTest, HidingTheMiddleOfThreeViewsKeepsTheOthersInOrder) {
@@ -120,26 +117,22 @@ TEST_F(BaseAppTest, HidingTheMiddleOfThreeViewsKeepsTheOthersInOrder) {
     EXPECT_EQ(1, last.inits);
 }
 
-TEST_F(BaseAppTest, ShowingARunningViewAssertsAndDoesNotInitItAgain) {
+TEST_F(BaseAppTest, ShowingARunningViewOrHidingAStrangerAssertsAndChangesNothing) {
     BaseApp* app = TestApp::get();
-    CountingView view;
+    CountingView view, stranger;
     app->showView(&view);
     app->showView(&view);
     expectAssertion("!running");
     EXPECT_EQ(1, view.inits);
-    app->hideView(&view);
-    EXPECT_EQ(nullptr, app->getCurrentView());
-    expectAssertion("!runningViews.empty()");
-}
 
-TEST_F(BaseAppTest, HidingAViewThatIsNotRunningAssertsAndLeavesItAlone) {
-    BaseApp* app = TestApp::get();
-    CountingView shown, stranger;
-    app->showView(&shown);
     app->hideView(&stranger);
     expectAssertion("it != runningViews.end()");
     EXPECT_EQ(0, stranger.shutdowns);
-    EXPECT_EQ(&shown, app->getCurrentView());
+    EXPECT_EQ(&view, app->getCurrentView());
+
+    app->hideView(&view);
+    EXPECT_EQ(nullptr, app->getCurrentView());
+    expectAssertion("!runningViews.empty()");
 }
 
 TEST_F(BaseAppTest, ViewThatFailsToInitEndsTheApplication) {

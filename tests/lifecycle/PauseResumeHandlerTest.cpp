@@ -56,28 +56,16 @@ protected:
 
 }  // namespace
 
-TEST_F(PauseResumeHandlerTest, ExistsFromStartToShutdownAndStartsPaused) {
-    ASSERT_NE(nullptr, handler());
-    EXPECT_TRUE(handler()->getIsAppPaused());
-    shutdownPal();
-    EXPECT_EQ(nullptr, handler());
-}
-
-TEST_F(PauseResumeHandlerTest, ResumeClearsPausedAndReachesEveryListenerOnce) {
+TEST_F(PauseResumeHandlerTest, AppEventsReachEveryListenerOnceWithThePausedFlagAlreadySet) {
     JournalListener first(&journal, "first");
     JournalListener second(&journal, "second");
+    std::vector<bool> pausedSeen;
+    first.action = [&] { pausedSeen.push_back(handler()->getIsAppPaused()); };
     deliver(&pal::postAppResumed);
-    EXPECT_FALSE(handler()->getIsAppPaused());
-    EXPECT_EQ((std::vector<std::string>{"first.resumed", "second.resumed"}), journal);
-}
-
-TEST_F(PauseResumeHandlerTest, PausedFlagIsSetBeforeListenersRun) {
-    deliver(&pal::postAppResumed);
-    JournalListener listener(&journal, "listener");
-    bool pausedSeen = false;
-    listener.action = [&] { pausedSeen = handler()->getIsAppPaused(); };
     deliver(&pal::postAppPaused);
-    EXPECT_TRUE(pausedSeen);
+    EXPECT_EQ((std::vector<std::string>{"first.resumed", "second.resumed", "first.paused", "second.paused"}),
+              journal);
+    EXPECT_EQ((std::vector<bool>{false, true}), pausedSeen);
 }
 
 TEST_F(PauseResumeHandlerTest, ViewEventsReachListenersAndLeaveTheAppFlag) {
@@ -91,24 +79,21 @@ TEST_F(PauseResumeHandlerTest, ViewEventsReachListenersAndLeaveTheAppFlag) {
               journal);
 }
 
-TEST_F(PauseResumeHandlerTest, ListenerOfADestroyedOwnerIsDroppedAtTheNextEvent) {
+TEST_F(PauseResumeHandlerTest, ListenersGoneBeforeOrDuringTheFanOutAreSkippedAndDropped) {
     size_t baseline = handler()->getListenerCount();
     std::unique_ptr<JournalListener> gone(new JournalListener(&journal, "gone"));
-    JournalListener kept(&journal, "kept");
-    gone.reset();
-    EXPECT_EQ(baseline + 2, handler()->getListenerCount());
-    deliver(&pal::postAppPaused);
-    EXPECT_EQ(baseline + 1, handler()->getListenerCount());
-    EXPECT_EQ((std::vector<std::string>{"kept.paused"}), journal);
-}
-
-TEST_F(PauseResumeHandlerTest, ListenerDestroyedByAnEarlierListenerIsNotCalled) {
     JournalListener killer(&journal, "killer");
     std::unique_ptr<JournalListener> victim(new JournalListener(&journal, "victim"));
     JournalListener last(&journal, "last");
+    gone.reset();
     killer.action = [&] { victim.reset(); };
+    EXPECT_EQ(baseline + 4, handler()->getListenerCount());
     deliver(&pal::postAppPaused);
     EXPECT_EQ((std::vector<std::string>{"killer.paused", "last.paused"}), journal);
+    // A registration whose owner is gone is dropped at the next event.
+    EXPECT_EQ(baseline + 3, handler()->getListenerCount());
+    deliver(&pal::postAppResumed);
+    EXPECT_EQ(baseline + 2, handler()->getListenerCount());
 }
 
 TEST_F(PauseResumeHandlerTest, ListenerAddedDuringAFanOutWaitsForTheNextEvent) {

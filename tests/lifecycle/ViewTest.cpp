@@ -27,20 +27,9 @@ std::string at(const std::string& what, int x, int y) {
     return what + " " + std::to_string(x) + "," + std::to_string(y);
 }
 
-KDint32 int32At(const KDEventData* data, size_t offset) {
-    KDint32 value;
-    std::memcpy(&value, data->bytes + offset, sizeof(value));
-    return value;
-}
-
-KDint16 int16At(const KDEventData* data, size_t offset) {
-    KDint16 value;
-    std::memcpy(&value, data->bytes + offset, sizeof(value));
-    return value;
-}
-
-float floatAt(const KDEventData* data, size_t offset) {
-    float value;
+template <typename T>
+T valueAt(const KDEventData* data, size_t offset) {
+    T value;
     std::memcpy(&value, data->bytes + offset, sizeof(value));
     return value;
 }
@@ -67,13 +56,14 @@ public:
         BaseView::onKey(key, x, y);
     }
     void onGesture(const KDEventData* data) override {
-        KDint32 subType = int32At(data, 0);
+        KDint32 subType = valueAt<KDint32>(data, 0);
         std::string text = "gesture " + std::to_string(subType);
+        if (subType == kGestureRotation || subType == kGestureFling || subType == kGestureTap) {
+            text += " " + std::to_string(valueAt<KDint16>(data, 4)) + "," +
+                    std::to_string(valueAt<KDint16>(data, 6));
+        }
         if (subType == kGestureRotation) {
-            text += " " + std::to_string(int16At(data, 4)) + "," + std::to_string(int16At(data, 6)) + " " +
-                    std::to_string(floatAt(data, 8));
-        } else if (subType == kGestureFling || subType == kGestureTap) {
-            text += " " + std::to_string(int16At(data, 4)) + "," + std::to_string(int16At(data, 6));
+            text += " " + std::to_string(valueAt<float>(data, 8));
         }
         journal.push_back(text);
     }
@@ -121,16 +111,6 @@ protected:
         pump();
     }
 
-    KDEvent keyEvent(KDint32 index) {
-        KDEvent event;
-        std::memset(&event, 0, sizeof(event));
-        event.type = KD_EVENT_INPUT;
-        event.userptr = view.get();
-        event.data.input.index = index;
-        event.data.input.value.i = 1;
-        return event;
-    }
-
     boost::scoped_ptr<RecordingView> view;
 };
 
@@ -152,8 +132,10 @@ TEST_F(ViewTest, ShowingCreatesTheManagersAndHidingDeletesThem) {
     EXPECT_TRUE(view->journal.empty());
 }
 
-TEST_F(ViewTest, ResumedViewReadsItsSizeDrawsOnceAndThenCostsNoWakeUps) {
+TEST_F(ViewTest, ResumedViewReadsItsSizeDrawsOneFrameIntoTheContextAndThenCostsNoWakeUps) {
     show();
+    view->colour[0] = 1.0f;
+    view->colour[2] = 0.5f;
     pal::postViewResumed();
     pump();
     EXPECT_TRUE(hasLogLine("Size: 480x800"));
@@ -162,6 +144,15 @@ TEST_F(ViewTest, ResumedViewReadsItsSizeDrawsOnceAndThenCostsNoWakeUps) {
     advance(kTick);
     EXPECT_EQ(view->journal, (Journal{"size 480x800", "update 16", "draw"}));
     EXPECT_EQ(pal::redrawCount(), 1);
+    std::vector<std::uint8_t> rgba;
+    int width = 0;
+    int height = 0;
+    ASSERT_TRUE(pal::readFrame(rgba, width, height));
+    ASSERT_EQ(rgba.size(), 480u * 800u * 4u);
+    size_t centre = (static_cast<size_t>(height / 2) * width + width / 2) * 4;
+    EXPECT_EQ(rgba[centre], 255);
+    EXPECT_EQ(rgba[centre + 1], 0);
+    EXPECT_NEAR(rgba[centre + 2], 128, 1);
 
     advance(kTick);
     EXPECT_FALSE(view->getRedrawManager()->getIsTimerStarted());
@@ -169,26 +160,6 @@ TEST_F(ViewTest, ResumedViewReadsItsSizeDrawsOnceAndThenCostsNoWakeUps) {
     advance(5 * 60 * kSecond);
     EXPECT_EQ(pal::timerFireCount(), fires);
     EXPECT_EQ(pal::redrawCount(), 1);
-}
-
-TEST_F(ViewTest, DrawRendersIntoTheMainContext) {
-    showResumedAndIdle();
-    view->colour[0] = 1.0f;
-    view->colour[2] = 0.5f;
-
-    view->getRedrawManager()->scheduleRedraw();
-    advance(kTick);
-
-    std::vector<std::uint8_t> rgba;
-    int width = 0;
-    int height = 0;
-    ASSERT_TRUE(pal::readFrame(rgba, width, height));
-    ASSERT_EQ(width, 480);
-    ASSERT_EQ(height, 800);
-    size_t centre = (static_cast<size_t>(height / 2) * width + width / 2) * 4;
-    EXPECT_EQ(rgba[centre], 255);
-    EXPECT_EQ(rgba[centre + 1], 0);
-    EXPECT_NEAR(rgba[centre + 2], 128, 1);
 }
 
 TEST_F(ViewTest, SizeChangeIsReportedOnceAndAnUnchangedSizeIsNot) {
@@ -228,14 +199,18 @@ TEST_F(ViewTest, FlingKeyPressesFlingsAndReleasesBeforeTheCallbackReturns) {
     pal::postPointerMove(view.get(), 100, 200);
     pump();
 
-    KDEvent event = keyEvent(BaseView::kKeyFlingLeft);
+    KDEvent event{};
+    event.type = KD_EVENT_INPUT;
+    event.userptr = view.get();
+    event.data.input.index = BaseView::kKeyFlingLeft;
+    event.data.input.value.i = 1;
     BaseView::inputCallback(&event);
 
     EXPECT_EQ(view->journal,
               (Journal{"key 8198 100,200", "pressed 100,200", "gesture 3 -900,0", "released 100,200"}));
 }
 
-TEST_F(ViewTest, KeyEmulationTable) {
+TEST_F(ViewTest, KeyEmulationTableAndUnsupportedKeyReported) {
     show();
     kdInstallCallback(&onKeyAction, KD_EVENT_VIEW_KEY_ACTION_ZVR, view.get());
     gKeyActions.clear();
@@ -247,22 +222,18 @@ TEST_F(ViewTest, KeyEmulationTable) {
     deliverKey(BaseView::kKeyAlternate2, 1);
     deliverKey(BaseView::kKeyTap, 1);
     deliverKey(0x1234, 0);
+    deliverKey(BaseView::kKeyUnsupported, 1);
+    expectAssertion("key.index != kKeyUnsupported");
 
-    EXPECT_EQ(view->journal, (Journal{"key 8199 7,8", "pressed 7,8", "gesture 3 900,0", "released 7,8",
-                                      "key 8201 7,8", "key 40961 7,8", "key 8202 7,8", "key 40962 7,8",
-                                      "key 4101 7,8", "pressed 7,8", "gesture 5 7,8", "released 7,8"}));
+    EXPECT_EQ(view->journal,
+              (Journal{"key 8199 7,8", "pressed 7,8", "gesture 3 900,0", "released 7,8", "key 8201 7,8",
+                       "key 40961 7,8", "key 8202 7,8", "key 40962 7,8", "key 4101 7,8", "pressed 7,8",
+                       "gesture 5 7,8", "released 7,8", "key 4105 7,8"}));
     EXPECT_EQ(gKeyActions, (Journal{"105"}));
     kdInstallCallback(nullptr, KD_EVENT_VIEW_KEY_ACTION_ZVR, view.get());
 }
 
-TEST_F(ViewTest, UnsupportedKeyIsReported) {
-    show();
-    deliverKey(BaseView::kKeyUnsupported, 1);
-    expectAssertion("key.index != kKeyUnsupported");
-    EXPECT_EQ(view->journal, (Journal{"key 4105 0,0"}));
-}
-
-TEST_F(ViewTest, GesturesWithoutMovementAreNotReported) {
+TEST_F(ViewTest, GesturesWithoutMovementAreNotReportedAndEmulatedRotationIsPressRotateRelease) {
     show();
     float one = 1.0f;
     float scale = 1.5f;
@@ -282,10 +253,8 @@ TEST_F(ViewTest, GesturesWithoutMovementAreNotReported) {
     pump();
 
     EXPECT_EQ(view->journal, (Journal{"gesture 1", "gesture 3 0,3", "gesture 4", "gesture 8 0,0 0.250000"}));
-}
 
-TEST_F(ViewTest, EmulatedRotationCarriesPositionAndAngle) {
-    show();
+    view->journal.clear();
     view->emulateRotation(12, 34, 0.5f);
     EXPECT_EQ(view->journal, (Journal{"pressed 12,34", "gesture 8 12,34 0.500000", "released 12,34"}));
 }
@@ -300,8 +269,7 @@ TEST_F(ViewTest, ViewEventsReachTheViewAndOrientationSchedulesAnUpdate) {
 
     EXPECT_EQ(view->journal, (Journal{"event104", "event106", "update 16"}));
 
-    KDEvent unknown;
-    std::memset(&unknown, 0, sizeof(unknown));
+    KDEvent unknown{};
     unknown.type = KD_EVENT_INPUT;
     view->handleEvent(&unknown);
     expectAssertion("isMainEventType(event->type)");
@@ -340,26 +308,18 @@ TEST_F(ViewTest, PausedViewStopsItsTimerAndResumesWithAFreshFrame) {
     EXPECT_EQ(view->journal, (Journal{"update 16", "draw"}));
 }
 
-TEST_F(ViewTest, ViewShownAgainAfterHidingIsResumedAgain) {
-    showResumedAndIdle();
-    TestApp::get()->hideView(view.get());
-    TestApp::get()->showView(view.get());
-
-    pal::postViewResumed();
-    pump();
-    advance(kTick);
-
-    EXPECT_EQ(view->journal, (Journal{"update 16", "draw"}));
-}
-
-TEST_F(ViewTest, RedrawStillQueuedWhenTheViewIsHiddenIsNotDrawn) {
+TEST_F(ViewTest, HiddenViewDropsItsQueuedRedrawAndIsResumedAgainWhenShownAgain) {
     showResumedAndIdle();
     view->redraw();
     TestApp::get()->hideView(view.get());
-
     pump();
-
     EXPECT_TRUE(view->journal.empty());
+
+    TestApp::get()->showView(view.get());
+    pal::postViewResumed();
+    pump();
+    advance(kTick);
+    EXPECT_EQ(view->journal, (Journal{"update 16", "draw"}));
 }
 
 TEST_F(ViewTest, DeletedViewReceivesNoMoreEvents) {

@@ -92,45 +92,22 @@ TEST_F(ViewRedrawManagerTest, ScheduledUpdateAfterIdleSpellIsOneTickLong) {
     EXPECT_FALSE(manager->getIsTimerStarted());
 }
 
-TEST_F(ViewRedrawManagerTest, GeneratorUpdatesEveryTickAndTimerStopsAfterItGoes) {
+TEST_F(ViewRedrawManagerTest, GeneratorsUpdateEveryTickUntilTheLastGoesAndAScheduledUpdateJoinsThem) {
     resumeAndSettle();
-    {
-        Redraw::UpdateGenerator generator(*manager);
-        advance(6 * kTick);
-        EXPECT_EQ(delegate.updates, (std::vector<int>(6, 16)));
-        EXPECT_TRUE(manager->getIsTimerStarted());
-    }
-    advance(kTick);
-
-    EXPECT_EQ(delegate.updates.size(), 6u);
-    EXPECT_FALSE(manager->getIsTimerStarted());
-}
-
-TEST_F(ViewRedrawManagerTest, NestedGeneratorsKeepUpdatingUntilTheLastOneGoes) {
-    resumeAndSettle();
+    manager->scheduleUpdate();
     boost::scoped_ptr<Redraw::UpdateGenerator> outer(new Redraw::UpdateGenerator(*manager));
     boost::scoped_ptr<Redraw::UpdateGenerator> inner(new Redraw::UpdateGenerator(*manager));
+    advance(6 * kTick);
+    EXPECT_EQ(delegate.updates, (std::vector<int>(6, 16)));
 
     outer.reset();
     advance(2 * kTick);
-    EXPECT_EQ(delegate.updates.size(), 2u);
+    EXPECT_EQ(delegate.updates.size(), 8u);
+    EXPECT_TRUE(manager->getIsTimerStarted());
 
     inner.reset();
     advance(2 * kTick);
-    EXPECT_EQ(delegate.updates.size(), 2u);
-    EXPECT_FALSE(manager->getIsTimerStarted());
-}
-
-TEST_F(ViewRedrawManagerTest, GeneratorJoiningScheduledUpdateCountsOnce) {
-    resumeAndSettle();
-    manager->scheduleUpdate();
-    {
-        Redraw::UpdateGenerator generator(*manager);
-        advance(2 * kTick);
-    }
-    advance(2 * kTick);
-
-    EXPECT_EQ(delegate.updates.size(), 2u);
+    EXPECT_EQ(delegate.updates.size(), 8u);
     EXPECT_FALSE(manager->getIsTimerStarted());
 }
 
