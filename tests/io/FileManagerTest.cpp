@@ -102,15 +102,10 @@ TEST_F(FileManagerTest, NestedInitialisationsKeepThePackageOpenUntilTheLastShutd
     EXPECT_EQ(big, readAll(*kept));
 }
 
-TEST_F(FileManagerTest, OpeningAResourceBeforeInitialisationIsEmpty) {
-    writePackage("/res/app.pak");
+TEST_F(FileManagerTest, NothingOpensBeforeInitialisationAndOnlyOverridesWithoutAPackage) {
     writeFile("/data/a.png", bytesOf("override"));
     EXPECT_FALSE(FileManager::openInputRes("a.png"));
     EXPECT_EQ(1, countLogLines("not initialised"));
-}
-
-TEST_F(FileManagerTest, AMissingPackageIsLoggedAndLeavesOnlyOverrides) {
-    writeFile("/data/a.png", bytesOf("override"));
     init();
     EXPECT_EQ(1, countLogLines("/res/app.pak"));
     EXPECT_EQ(bytesOf("override"), readResource("a.png"));
@@ -128,22 +123,24 @@ TEST_F(FileManagerTest, ANameTooLongToOverrideIsNotCutIntoAnotherFile) {
 TEST_F(FileManagerTest, ResourcesOpenAndReadOnSeveralThreadsAtOnce) {
     writePackage("/res/app.pak");
     init();
-    struct Worker {
-        static void* run(void* arg) {
-            int* matches = static_cast<int*>(arg);
-            for (int i = 0; i < 20; ++i) {
-                boost::shared_ptr<IO::InputStream> stream = FileManager::openInputRes("big.bin");
-                *matches += stream && readAll(*stream) == pattern(1000, 2) ? 1 : 0;
-            }
-            return nullptr;
-        }
-    };
     int matches[2] = {0, 0};
-    KDThread* first = kdThreadCreate(nullptr, &Worker::run, &matches[0]);
-    KDThread* second = kdThreadCreate(nullptr, &Worker::run, &matches[1]);
-    ASSERT_TRUE(first && second);
-    kdThreadJoin(first, nullptr);
-    kdThreadJoin(second, nullptr);
+    KDThread* threads[2];
+    for (int i = 0; i < 2; ++i) {
+        threads[i] = kdThreadCreate(
+            nullptr,
+            [](void* count) -> void* {
+                for (int round = 0; round < 20; ++round) {
+                    boost::shared_ptr<IO::InputStream> stream = FileManager::openInputRes("big.bin");
+                    *static_cast<int*>(count) += stream && readAll(*stream) == pattern(1000, 2) ? 1 : 0;
+                }
+                return nullptr;
+            },
+            &matches[i]);
+        ASSERT_TRUE(threads[i]);
+    }
+    for (KDThread* thread : threads) {
+        kdThreadJoin(thread, nullptr);
+    }
     EXPECT_EQ(20, matches[0]);
     EXPECT_EQ(20, matches[1]);
 }

@@ -55,8 +55,8 @@ TEST_F(GzipStreamTest, WhatIsWrittenReadsBackIdenticallyAtEverySize) {
 }
 
 TEST_F(GzipStreamTest, OutputIsAGzipStreamThatZlibReads) {
-    Bytes data = pattern(20000);
-    Bytes compressed = gzip(data);
+    const Bytes data = pattern(20000);
+    const Bytes compressed = gzip(data);
     ASSERT_GE(compressed.size(), 18u);
     EXPECT_EQ(0x1f, compressed[0]);
     EXPECT_EQ(0x8b, compressed[1]);
@@ -64,7 +64,7 @@ TEST_F(GzipStreamTest, OutputIsAGzipStreamThatZlibReads) {
     z_stream zs = {};
     ASSERT_EQ(Z_OK, inflateInit2(&zs, 31));
     Bytes out(data.size() + 1);
-    zs.next_in = compressed.data();
+    zs.next_in = const_cast<Bytef*>(compressed.data());
     zs.avail_in = static_cast<uInt>(compressed.size());
     zs.next_out = out.data();
     zs.avail_out = static_cast<uInt>(out.size());
@@ -109,10 +109,7 @@ TEST_F(GzipStreamTest, EmptyInputLogsTheBufferErrorAndHasNoContent) {
 TEST_F(GzipStreamTest, ATruncatedStreamIsEmptyAtEveryCut) {
     Bytes compressed = gzip(pattern(3000));
     for (size_t cut = 1; cut < compressed.size(); cut += 7) {
-        Bytes truncated(compressed.begin(), compressed.begin() + cut);
-        IO::ByteArrayInputStream in(truncated.data(), static_cast<int>(truncated.size()));
-        IO::Zip::GzipInputStream unzipped(&in);
-        EXPECT_EQ(0, unzipped.available()) << cut;
+        EXPECT_EQ(Bytes(), gunzip(slice(compressed, 0, cut))) << cut;
     }
     EXPECT_GT(countLogLines("GzipInputStream::read error -5"), 0);
 }
@@ -128,22 +125,16 @@ TEST_F(GzipStreamTest, ACorruptStreamIsEmptyOrPassedThroughButNeverGarbled) {
     }
 }
 
-TEST_F(GzipStreamTest, ExceptionsReachTheInflatedContent) {
-    Bytes compressed = gzip(bytesOf("ab"));
-    IO::ByteArrayInputStream in(compressed.data(), static_cast<int>(compressed.size()));
-    IO::Zip::GzipInputStream unzipped(&in);
-    unzipped.enableExceptions();
-    EXPECT_EQ('a', unzipped.readUByte());
-    EXPECT_THROW(unzipped.readInt(), IO::Exception);
-}
-
-TEST_F(GzipStreamTest, ReadsOnlyWhatTheCompressedStreamHasLeft) {
-    Bytes compressed = gzip(bytesOf("tail"));
+TEST_F(GzipStreamTest, InflatesWhatTheInputHasLeftAndPassesExceptionsOnToTheContent) {
+    const Bytes compressed = gzip(bytesOf("ab"));
     Bytes framed = bytesOf("head");
     framed.insert(framed.end(), compressed.begin(), compressed.end());
     IO::ByteArrayInputStream in(framed.data(), static_cast<int>(framed.size()));
     in.seek(4, KD_SEEK_SET);
     IO::Zip::GzipInputStream unzipped(&in);
-    EXPECT_EQ(bytesOf("tail"), readAll(unzipped));
     EXPECT_EQ(0, in.available());
+    unzipped.enableExceptions();
+    EXPECT_EQ('a', unzipped.readUByte());
+    EXPECT_THROW(unzipped.readInt(), IO::Exception);
+    EXPECT_EQ('b', unzipped.readUByte());
 }

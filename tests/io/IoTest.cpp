@@ -1,5 +1,7 @@
 #include "IoTest.h"
 
+#include <algorithm>
+
 #include "io/FileOutputStream.h"
 
 int IoTest::claimAssertions() {
@@ -23,16 +25,10 @@ IoTest::Bytes IoTest::pattern(size_t size, unsigned int seed) {
 IoTest::Bytes IoTest::readAll(IO::InputStream& stream) {
     Bytes all;
     unsigned char chunk[100];
-    for (;;) {
-        long long left = stream.available();
-        int want = left < static_cast<long long>(sizeof(chunk)) ? static_cast<int>(left) : sizeof(chunk);
-        if (want <= 0) {
-            break;
-        }
-        int count = stream.read(chunk, want);
-        if (count <= 0) {
-            break;
-        }
+    int count = 0;
+    while (stream.available() > 0 &&
+           (count = stream.read(
+                chunk, static_cast<int>(std::min<long long>(sizeof(chunk), stream.available())))) > 0) {
         all.insert(all.end(), chunk, chunk + count);
     }
     return all;

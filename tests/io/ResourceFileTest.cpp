@@ -69,6 +69,21 @@ protected:
     boost::shared_ptr<IO::Resource::FileSystem> index() {
         return ResourceFile::createFileSystem(packageStream());
     }
+    // "X" split in three by hand, with the given extra field, which the builder never writes.
+    void writeDamagedPackage(const Bytes& extra, bool withLastPart) {
+        IO::Zip::ZipOutputStream zip(package);
+        zip.openEntry("X", true, extra);
+        zip.write(thousand.data(), 400);
+        zip.closeEntry();
+        zip.openEntry("X.part001", false);
+        zip.write(thousand.data() + 400, 400);
+        zip.closeEntry();
+        if (withLastPart) {
+            zip.openEntry("X.part002", true);
+            zip.write(thousand.data() + 800, 200);
+            zip.closeEntry();
+        }
+    }
 
     Bytes thousand = pattern(1000, 7);
 };
@@ -129,9 +144,13 @@ TEST_F(BlockStreamTest, AMissingBlockEndsTheReadShortAndALongOneLendsNoBytes) {
     EXPECT_EQ(thousand, all);
 }
 
-TEST_F(ResourceFileTest, ASplitResourceReadsBackThroughItsPartsWithOrWithoutAPreparedIndex) {
-    buildPackage(400, true);
-    ASSERT_TRUE(index());
+TEST_F(ResourceFileTest, OnlyAResourceLargerThanItsBlockIsSplitAndReadsBackWithOrWithoutAnIndex) {
+    const Bytes four = pattern(400, 3);
+    {
+        PackageBuilder builder(package, 400);
+        EXPECT_TRUE(builder.addResource("X", thousand.data(), thousand.size(), true));
+        EXPECT_TRUE(builder.addResource("four", four.data(), four.size(), true));
+    }
     boost::shared_ptr<IO::InputStream> stream = openResource("X", index());
     ASSERT_TRUE(dynamic_cast<IO::Resource::ResBlockInputStream*>(stream.get()));
     EXPECT_EQ(1000, stream->available());
@@ -143,6 +162,11 @@ TEST_F(ResourceFileTest, ASplitResourceReadsBackThroughItsPartsWithOrWithoutAPre
     stream = openResource("X", boost::shared_ptr<IO::Resource::FileSystem>());
     ASSERT_TRUE(stream);
     EXPECT_EQ(thousand, readAll(*stream));
+
+    stream = openResource("four", index());
+    ASSERT_TRUE(stream);
+    EXPECT_FALSE(dynamic_cast<IO::Resource::ResBlockInputStream*>(stream.get()));
+    EXPECT_EQ(four, readAll(*stream));
 }
 
 TEST_F(ResourceFileTest, StoredPartsShareOnePackageStreamAndStillReadRight) {
@@ -157,22 +181,6 @@ TEST_F(ResourceFileTest, StoredPartsShareOnePackageStreamAndStillReadRight) {
     }
 }
 
-TEST_F(ResourceFileTest, AResourceNoLargerThanItsBlockIsASingleEntry) {
-    const Bytes four = pattern(400, 3);
-    {
-        PackageBuilder builder(package, 400);
-        EXPECT_TRUE(builder.addResource("X", four.data(), four.size(), true));
-        EXPECT_TRUE(builder.addResource("plain", thousand.data(), 0, false));
-    }
-    boost::shared_ptr<IO::InputStream> stream = openResource("X", index());
-    ASSERT_TRUE(stream);
-    EXPECT_FALSE(dynamic_cast<IO::Resource::ResBlockInputStream*>(stream.get()));
-    EXPECT_EQ(four, readAll(*stream));
-    boost::shared_ptr<IO::InputStream> empty = openResource("plain", index());
-    ASSERT_TRUE(empty);
-    EXPECT_EQ(0, empty->available());
-}
-
 TEST_F(ResourceFileTest, AMissingResourceOrAnUnreadablePackageIsEmpty) {
     buildPackage(0, true);
     EXPECT_FALSE(openResource("Y", index()));
@@ -184,31 +192,8 @@ TEST_F(ResourceFileTest, AMissingResourceOrAnUnreadablePackageIsEmpty) {
     expectAssertion("false");
 }
 
-namespace {
-
-// Packages with hand-made extra fields, which the builder never writes.
-class DamagedPackageTest : public ResourceFileTest {
-protected:
-    void writePackage(const Bytes& extra, bool withLastPart) {
-        IO::Zip::ZipOutputStream zip(package);
-        zip.openEntry("X", true, extra);
-        zip.write(thousand.data(), 400);
-        zip.closeEntry();
-        zip.openEntry("X.part001", false);
-        zip.write(thousand.data() + 400, 400);
-        zip.closeEntry();
-        if (withLastPart) {
-            zip.openEntry("X.part002", true);
-            zip.write(thousand.data() + 800, 200);
-            zip.closeEntry();
-        }
-    }
-};
-
-}  // namespace
-
-TEST_F(DamagedPackageTest, AMissingPartEndsTheResourceShort) {
-    writePackage({0xE8, 0x03, 0, 0, 0x90, 0x01, 0, 0}, false);
+TEST_F(ResourceFileTest, ADamagedPackageWithAMissingPartEndsTheResourceShort) {
+    writeDamagedPackage({0xE8, 0x03, 0, 0, 0x90, 0x01, 0, 0}, false);
     boost::shared_ptr<IO::InputStream> stream = openResource("X", index());
     ASSERT_TRUE(stream);
     Bytes all(1000);
@@ -217,13 +202,13 @@ TEST_F(DamagedPackageTest, AMissingPartEndsTheResourceShort) {
     expectAssertion("entry");
 }
 
-TEST_F(DamagedPackageTest, AnExtraFieldOfTheWrongSizeOrABlockSizeOfZeroIsRefused) {
-    writePackage({0xE8, 0x03, 0}, true);
+TEST_F(ResourceFileTest, ADamagedPackageWithAWrongSizedExtraFieldOrABlockSizeOfZeroIsRefused) {
+    writeDamagedPackage({0xE8, 0x03, 0}, true);
     EXPECT_FALSE(openResource("X", index()));
     expectAssertion("entry->extra.size() == sizeof(ExtraField)");
 
     package = boost::make_shared<IO::ByteArrayOutputStream>();
-    writePackage({0xE8, 0x03, 0, 0, 0, 0, 0, 0}, true);
+    writeDamagedPackage({0xE8, 0x03, 0, 0, 0, 0, 0, 0}, true);
     EXPECT_FALSE(openResource("X", index()));
     expectAssertion("extra.blockSize > 0");
 }
