@@ -1,15 +1,11 @@
 // The graphics context of the desktop platform layer: real OpenGL ES 1.1
 // rendering into the simulated main context, read back pixel by pixel.
 #include <GLES/gl.h>
-#include <KD/kdext.h>
-#include <gtest/gtest.h>
-#include <pal/Simulation.h>
 
 #include <cstdint>
-#include <cstdlib>
-#include <filesystem>
-#include <string>
 #include <vector>
+
+#include "BootedPalTest.h"
 
 namespace {
 
@@ -24,39 +20,22 @@ int gCallsB = 0;
 KDViewProxyZVR gViewA;
 KDViewProxyZVR gViewB;
 
-void clearToColour() {
-    glClearColor(gClearColour.r / 255.0f, gClearColour.g / 255.0f, gClearColour.b / 255.0f,
-                 gClearColour.a / 255.0f);
-    glClear(GL_COLOR_BUFFER_BIT | GL_DEPTH_BUFFER_BIT);
-}
-
 void drawA(KDViewProxyZVR* view) {
     EXPECT_EQ(view, &gViewA);
     ++gCallsA;
-    clearToColour();
+    glClearColor(gClearColour.r / 255.0f, gClearColour.g / 255.0f, gClearColour.b / 255.0f,
+                 gClearColour.a / 255.0f);
+    glClear(GL_COLOR_BUFFER_BIT | GL_DEPTH_BUFFER_BIT);
 }
 
 void drawB(KDViewProxyZVR*) {
     ++gCallsB;
 }
 
-void drawAndRequestAgain(KDViewProxyZVR* view) {
-    ++gCallsA;
-    clearToColour();
-    kdGFXRequestRedraw(view);
-}
-
-class GraphicsTest : public ::testing::Test {
+class GraphicsTest : public BootedPalTest {
 protected:
     void SetUp() override {
-        std::string pattern = (std::filesystem::temp_directory_path() / "pal-gfx-XXXXXX").string();
-        ASSERT_NE(mkdtemp(pattern.data()), nullptr);
-        root = pattern;
-        pal::setFileRoot(root);
-        pal::resetSimulation();
-        pal::useVirtualClock();
-        pal::setLogSink([this](const char* line) { log.push_back(line); });
-        pal::start();
+        BootedPalTest::SetUp();
         gClearColour = {0, 0, 0, 255};
         gCallsA = 0;
         gCallsB = 0;
@@ -65,14 +44,16 @@ protected:
     void TearDown() override {
         kdGFXSetRedrawHandler(&gViewA, nullptr);
         kdGFXSetRedrawHandler(&gViewB, nullptr);
-        pal::shutdown();
-        pal::resetSimulation();
-        pal::setLogSink(pal::LogSink());
-        std::filesystem::remove_all(root);
+        BootedPalTest::TearDown();
+    }
+
+    static void redrawA() {
+        kdGFXRequestRedraw(&gViewA);
+        kdPumpEvents();
     }
 
     // Reads the frame and checks that every pixel has the colour.
-    void expectFrame(int expectedWidth, int expectedHeight, Colour colour) {
+    static void expectFrame(int expectedWidth, int expectedHeight, Colour colour) {
         std::vector<std::uint8_t> rgba;
         int width = 0;
         int height = 0;
@@ -90,9 +71,6 @@ protected:
         EXPECT_EQ(wrong, 0) << "first pixel " << int(rgba[0]) << "," << int(rgba[1]) << "," << int(rgba[2])
                             << "," << int(rgba[3]);
     }
-
-    std::string root;
-    std::vector<std::string> log;
 };
 
 TEST_F(GraphicsTest, QueryAnswersTheSimulatedSizeWithoutAContext) {
@@ -115,42 +93,34 @@ TEST_F(GraphicsTest, QueryAnswersTheSimulatedSizeWithoutAContext) {
     EXPECT_FALSE(pal::readFrame(rgba, width, height));
 }
 
-TEST_F(GraphicsTest, RepeatedRequestsAreServedByOneHandlerCallThatDrawsIntoTheFrame) {
+TEST_F(GraphicsTest, RepeatedRequestsMakeOneFrameAndASizeChangeWaitsForTheNextRedraw) {
     pal::setContextSize(64, 32);
     gClearColour = {255, 128, 0, 255};
     kdGFXSetRedrawHandler(&gViewA, drawA);
     kdGFXRequestRedraw(&gViewA);
     kdGFXRequestRedraw(&gViewA);
     EXPECT_EQ(gCallsA, 0);  // served from the event loop, not from the request
-
     kdPumpEvents();
     kdPumpEvents();
     EXPECT_EQ(gCallsA, 1);
     EXPECT_EQ(pal::redrawCount(), 1);
     expectFrame(64, 32, gClearColour);
-}
-
-TEST_F(GraphicsTest, SizeChangeTakesEffectAtTheNextRedraw) {
-    pal::setContextSize(16, 16);
-    kdGFXSetRedrawHandler(&gViewA, drawA);
-    kdGFXRequestRedraw(&gViewA);
-    kdPumpEvents();
-    expectFrame(16, 16, gClearColour);
 
     pal::setContextSize(40, 24);
-    expectFrame(16, 16, gClearColour);
+    expectFrame(64, 32, gClearColour);
     gClearColour = {0, 0, 255, 255};
-    kdGFXRequestRedraw(&gViewA);
-    kdPumpEvents();
+    redrawA();
     expectFrame(40, 24, gClearColour);
     EXPECT_EQ(pal::redrawCount(), 2);
 }
 
 TEST_F(GraphicsTest, AHandlerMayRequestItsNextFrame) {
     pal::setContextSize(8, 8);
-    kdGFXSetRedrawHandler(&gViewA, drawAndRequestAgain);
-    kdGFXRequestRedraw(&gViewA);
-    kdPumpEvents();
+    kdGFXSetRedrawHandler(&gViewA, [](KDViewProxyZVR* view) {
+        drawA(view);
+        kdGFXRequestRedraw(view);
+    });
+    redrawA();
     EXPECT_EQ(gCallsA, 1);
     kdPumpEvents();
     EXPECT_EQ(gCallsA, 2);
@@ -160,9 +130,8 @@ TEST_F(GraphicsTest, EachViewGetsItsOwnHandlerAndRemovedHandlersAreNotCalled) {
     pal::setContextSize(8, 8);
     kdGFXSetRedrawHandler(&gViewA, drawA);
     kdGFXSetRedrawHandler(&gViewB, drawB);
-    kdGFXRequestRedraw(&gViewA);
     kdGFXRequestRedraw(&gViewB);
-    kdPumpEvents();
+    redrawA();
     EXPECT_EQ(gCallsA, 1);
     EXPECT_EQ(gCallsB, 1);
 
@@ -177,19 +146,13 @@ TEST_F(GraphicsTest, AnImpossibleSizeSkipsTheRedrawWithOneLogLineAndAGoodSizeRec
     kdGFXSetRedrawHandler(&gViewA, drawA);
     pal::setContextSize(1 << 20, 1 << 20);
     for (int i = 0; i < 3; ++i) {
-        kdGFXRequestRedraw(&gViewA);
-        kdPumpEvents();
+        redrawA();
     }
     EXPECT_EQ(gCallsA, 0);
-    int lines = 0;
-    for (const std::string& line : log) {
-        lines += line.find("graphics unavailable") != std::string::npos ? 1 : 0;
-    }
-    EXPECT_EQ(lines, 1);
+    EXPECT_EQ(logLinesWith("graphics unavailable"), 1);
 
     pal::setContextSize(4, 4);
-    kdGFXRequestRedraw(&gViewA);
-    kdPumpEvents();
+    redrawA();
     EXPECT_EQ(gCallsA, 1);
     expectFrame(4, 4, gClearColour);
 }

@@ -26,19 +26,15 @@ struct GuardedBuffer {
 };
 
 TEST(StringsTest, SprintfCutsShortWithinTheBufferAndReportsTheFullLength) {
-    for (KDsize length : {1u, 2u, 5u, 11u, 12u, 13u}) {
+    for (KDsize length : {0u, 1u, 2u, 5u, 11u, 12u, 13u}) {
         SCOPED_TRACE(length);
         GuardedBuffer buffer(length);
         EXPECT_EQ(kdSprintf_s(buffer.data(), length, "%s-%d", "abcdef", 1234), 11);
         EXPECT_TRUE(buffer.canaryIntact());
-        EXPECT_EQ(buffer.text(), std::string("abcdef-1234").substr(0, length - 1));
+        if (length > 0) {
+            EXPECT_EQ(buffer.text(), std::string("abcdef-1234").substr(0, length - 1));
+        }
     }
-}
-
-TEST(StringsTest, SprintfWithoutRoomWritesNothing) {
-    GuardedBuffer buffer(0);
-    EXPECT_EQ(kdSprintf_s(buffer.data(), 0, "%d", 42), 2);
-    EXPECT_TRUE(buffer.canaryIntact());
     EXPECT_EQ(kdSprintf_s(nullptr, 0, "%s", "sized"), 5);
 }
 
