@@ -1,3 +1,4 @@
+#include <KD/kdext.h>
 #include <gtest/gtest.h>
 
 #include <boost/make_shared.hpp>
@@ -55,21 +56,15 @@ TEST(NetworkInterfacesTest, RequestStateIsFoundOnlyAsItsOwnTypeAndOnlyWhileItLiv
     EXPECT_FALSE(Network::getRequestState<RunningState>(boost::shared_ptr<Network::NetworkTask>()));
 }
 
-TEST(NetworkInterfacesTest, FixedFinishCodesAreNegativeDistinctAndTheEnginesOfflineCode) {
+TEST(NetworkInterfacesTest, FixedCodesMatchTheEngineAndStatusValuesMatchThePlatform) {
     EXPECT_EQ(-1073741825, Network::OFFLINE_ERROR_CODE);
     EXPECT_EQ(-1073741826, Network::TASK_TIMEOUT_ERROR_CODE);
     EXPECT_EQ(Network::HTTP_OFFLINE_ERROR_CODE, Network::OFFLINE_ERROR_CODE);
     EXPECT_NE(Network::HTTP_TIMEOUT_ERROR_CODE, Network::TASK_TIMEOUT_ERROR_CODE);
-}
-
-TEST(NetworkInterfacesTest, StatusValuesAreThoseThePlatformAndListenersUse) {
+    EXPECT_EQ(KD_NETWORK_NOT_REACHABLE_ZVR, Network::NetworkManager::NetworkNotReachable);
+    EXPECT_EQ(KD_NETWORK_REACHABLE_VIA_WIFI_ZVR, Network::NetworkManager::NetworkReachableViaWifi);
+    EXPECT_EQ(KD_NETWORK_REACHABLE_VIA_MOBILE_ZVR, Network::NetworkManager::NetworkReachableViaMobile);
     EXPECT_EQ(0, Network::NetworkManager::OfflineModeOff);
-    EXPECT_EQ(1, Network::NetworkManager::OfflineModeOn);
-    EXPECT_EQ(0, Network::NetworkManager::NetworkNotReachable);
-    EXPECT_EQ(1, Network::NetworkManager::NetworkReachableViaWifi);
-    EXPECT_EQ(2, Network::NetworkManager::NetworkReachableViaMobile);
     EXPECT_EQ(0, Network::NetworkManager::NoNetworkError);
-    EXPECT_EQ(1, Network::NetworkManager::NetworkError);
     EXPECT_EQ(0, Network::NetworkManager::NetworkActive);
-    EXPECT_EQ(1, Network::NetworkManager::NetworkIdle);
 }
