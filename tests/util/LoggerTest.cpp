@@ -14,12 +14,10 @@ protected:
 
 }  // namespace
 
-TEST_F(LoggerTest, WritesTheFormattedMessageWithoutPrefix) {
-    Logger::log(Logger::Info, "tile %d of %s", 3, "z12");
+TEST_F(LoggerTest, WritesFormattedMessagesUpToTheLevelWhichDefaultsToAll) {
+    Logger::log(Logger::Debug, "tile %d of %s", 3, "z12");
     EXPECT_TRUE(hasLogLine("tile 3 of z12"));
-}
 
-TEST_F(LoggerTest, DropsMessagesAboveTheLevel) {
     Logger::level = Logger::Warning;
     clearLog();
     Logger::log(Logger::Error, "error");
@@ -27,10 +25,4 @@ TEST_F(LoggerTest, DropsMessagesAboveTheLevel) {
     Logger::log(Logger::Info, "info");
     Logger::log(Logger::Debug, "debug");
     EXPECT_EQ((std::vector<std::string>{"error", "warning"}), logLines());
-}
-
-TEST_F(LoggerTest, DefaultLevelWritesEverything) {
-    EXPECT_EQ(Logger::Debug, Logger::level);
-    Logger::log(Logger::Debug, "debug");
-    EXPECT_TRUE(hasLogLine("debug"));
 }

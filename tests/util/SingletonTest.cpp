@@ -49,17 +49,13 @@ protected:
 
 }  // namespace
 
-TEST_F(SingletonTest, GetInstanceCreatesOnceAndReturnsTheSameObject) {
+TEST_F(SingletonTest, CreatedOnceOnFirstUseAndDestroyedAtShutdownInReverseOrder) {
     First* first = First::getInstance();
     ASSERT_NE(nullptr, first);
     EXPECT_EQ(first, First::getInstance());
-    EXPECT_TRUE(destroyed.empty());
-}
-
-TEST_F(SingletonTest, ShutdownDestroysInReverseOrderOfCreation) {
-    First::getInstance();
     Second::getInstance();
     Third::getInstance();
+    EXPECT_TRUE(destroyed.empty());
     shutdownPal();
     EXPECT_EQ((std::vector<std::string>{"Third", "Second", "First"}), destroyed);
     EXPECT_TRUE(Util::SingletonStorage::getWasDestroyed());
@@ -88,18 +84,7 @@ TEST_F(SingletonTest, EachPlatformRunGetsFreshInstances) {
     EXPECT_EQ((std::vector<std::string>{"First"}), destroyed);
 }
 
-TEST_F(SingletonTest, RegisteringAfterTeardownAssertsAndTheLateObjectIsStillDestroyed) {
-    Second::getInstance();
-    shutdownPal();
-    First::getInstance();
-    expectAssertion("!wasDestroyed");
-    // An embedding program that tears the store down again frees the late one.
-    Util::SingletonStorage::deleteSingletonStorage(nullptr);
-    expectAssertion("!wasDestroyed");
-    EXPECT_EQ((std::vector<std::string>{"Second", "First"}), destroyed);
-}
-
-TEST_F(SingletonTest, TeardownTwiceAssertsAndChangesNothing) {
+TEST_F(SingletonTest, TeardownTwiceOrRegisteringAfterTeardownAssertsAndDestroysEachObjectOnce) {
     Second::getInstance();
     shutdownPal();
     Util::SingletonStorage::deleteSingletonStorage(nullptr);
@@ -107,4 +92,11 @@ TEST_F(SingletonTest, TeardownTwiceAssertsAndChangesNothing) {
     expectAssertion("!wasDestroyed");
     EXPECT_EQ((std::vector<std::string>{"Second"}), destroyed);
     EXPECT_TRUE(Util::SingletonStorage::getWasDestroyed());
+
+    First::getInstance();
+    expectAssertion("!wasDestroyed");
+    // An embedding program that tears the store down again frees the late one.
+    Util::SingletonStorage::deleteSingletonStorage(nullptr);
+    expectAssertion("!wasDestroyed");
+    EXPECT_EQ((std::vector<std::string>{"Second", "First"}), destroyed);
 }

@@ -82,39 +82,24 @@ TEST_F(ThreadCallbackTest, CallOnTheOwnerThreadRunsBeforeReturning) {
     EXPECT_EQ(kdThreadSelf(), receiver.threadCallback->getThread());
 }
 
-TEST_F(ThreadCallbackTest, CallFromAWorkerRunsLaterOnTheOwnerWithTheSameContext) {
+TEST_F(ThreadCallbackTest, CallsFromAWorkerRunLaterOnTheOwnerInPostingOrderWithTheirContexts) {
     Receiver receiver;
-    Job job{&receiver, numberedContexts(1)};
+    Job job{&receiver, numberedContexts(50)};
+    job.contexts.push_back(boost::shared_ptr<Util::ThreadCallback::Context>());
     runOnWorker(job);
     EXPECT_TRUE(receiver.contexts.empty());
     EXPECT_NE(kdThreadSelf(), job.postedFrom);
 
     pump();
-    ASSERT_EQ(1u, receiver.contexts.size());
-    EXPECT_EQ(job.contexts[0].get(), receiver.contexts[0]);
-    EXPECT_EQ(kdThreadSelf(), receiver.threads[0]);
-    // The posted record let go of its reference after the call.
-    EXPECT_EQ(1, job.contexts[0].use_count());
-}
-
-TEST_F(ThreadCallbackTest, CallsFromAWorkerRunInPostingOrder) {
-    Receiver receiver;
-    Job job{&receiver, numberedContexts(50)};
-    runOnWorker(job);
-    pump();
-    ASSERT_EQ(50u, receiver.contexts.size());
+    ASSERT_EQ(51u, receiver.contexts.size());
     for (int i = 0; i < 50; ++i) {
+        EXPECT_EQ(job.contexts[i].get(), receiver.contexts[i]);
         EXPECT_EQ(i, static_cast<NumberContext*>(receiver.contexts[i])->number);
+        EXPECT_EQ(kdThreadSelf(), receiver.threads[i]);
+        // The posted record let go of its reference after the call.
+        EXPECT_EQ(1, job.contexts[i].use_count());
     }
-}
-
-TEST_F(ThreadCallbackTest, EmptyContextIsDelivered) {
-    Receiver receiver;
-    Job job{&receiver, {boost::shared_ptr<Util::ThreadCallback::Context>()}};
-    runOnWorker(job);
-    pump();
-    ASSERT_EQ(1u, receiver.contexts.size());
-    EXPECT_EQ(nullptr, receiver.contexts[0]);
+    EXPECT_EQ(nullptr, receiver.contexts[50]);
 }
 
 TEST_F(ThreadCallbackTest, DestroyedWithCallsQueuedRunsNothingAndFreesTheirContexts) {

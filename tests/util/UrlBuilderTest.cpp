@@ -21,46 +21,30 @@ TEST(UrlBuilderTest, JoinsBaseAndPathWithExactlyOneSlash) {
     EXPECT_EQ("http://h:80/api", joined("http://h:80/api", ""));
 }
 
-TEST(UrlBuilderTest, FirstParameterFollowsQuestionMarkLaterOnesAmpersand) {
+TEST(UrlBuilderTest, FirstParameterFollowsQuestionMarkLaterOnesAmpersandAlsoAfterClean) {
     UrlBuilder builder("http://h/startup");
     builder.addIntParam("a", 1).addIntParam("b", -2).addEmptyParam("c").addStringParam("d", "x y");
-    EXPECT_EQ("http://h/startup?a=1&b=-2&c&d=x y", builder.buildString());
-}
+    builder.getParamStream() << "&raw=" << 0.5;
+    EXPECT_EQ("http://h/startup?a=1&b=-2&c&d=x y&raw=0.500000", builder.buildString());
 
-TEST(UrlBuilderTest, CleanStartsANewUrlWithQuestionMarkAndNoPath) {
-    UrlBuilder builder("http://old/");
     builder.setAdditionPath("search");
-    builder.addIntParam("a", 1).addIntParam("b", 2);
     builder.clean("http://new/base");
     builder.addIntParam("c", 3).addIntParam("d", 4);
     EXPECT_EQ("http://new/base?c=3&d=4", builder.buildString());
 }
 
-TEST(UrlBuilderTest, WritesNumbersInTheirFixedForms) {
-    UrlBuilder builder("u");
+TEST(UrlBuilderTest, WritesNumbersAndCoordinatesInTheirFixedFormsAndOrder) {
+    GeoUrlBuilder builder("u");
     builder.addUIntParam("u", 4000000000u)
         .addIntPairParam("ip", -3, 7)
         .addFloatPairParam("fp", 37.5, 55.25)
         .addFloatParam("f2", 1.0 / 3.0, 2)
         .addFloatParam("f", 1e7);
-    EXPECT_EQ("u?u=4000000000&ip=-3,7&fp=37.500000,55.250000&f2=0.33&f=10000000.000000",
-              builder.buildString());
-}
-
-TEST(UrlBuilderTest, ParamStreamContinuesTheQuery) {
-    UrlBuilder builder("u");
-    builder.addIntParam("a", 1);
-    builder.getParamStream() << "&raw=" << 0.5;
-    EXPECT_EQ("u?a=1&raw=0.500000", builder.buildString());
-}
-
-TEST(UrlBuilderTest, GeoParametersKeepTheGivenOrder) {
-    GeoUrlBuilder builder("http://h/route");
     builder.addLonLatParam("ll", 13.4, 52.5).addLatLonParam("la", 52.5, 13.4);
     builder.addLonLatPairParam("bbox", 1, -2.5, 3.125, 4);
     EXPECT_EQ(
-        "http://h/route?ll=13.400000,52.500000&la=52.500000,13.400000"
-        "&bbox=1.000000,-2.500000~3.125000,4.000000",
+        "u?u=4000000000&ip=-3,7&fp=37.500000,55.250000&f2=0.33&f=10000000.000000"
+        "&ll=13.400000,52.500000&la=52.500000,13.400000&bbox=1.000000,-2.500000~3.125000,4.000000",
         builder.buildString());
 }
 

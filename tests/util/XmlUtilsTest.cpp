@@ -56,26 +56,15 @@ protected:
 
 }  // namespace
 
-TEST_F(XmlUtilsTest, LoadsPlainAndGzippedDocuments) {
+TEST_F(XmlUtilsTest, LoadsPlainOrGzippedDocumentsInPlaceOfThePreviousOne) {
     const std::string text = "<?xml version=\"1.0\"?><startup><uuid>abc</uuid></startup>";
-    ASSERT_TRUE(XmlUtils::load(bytesOf(text), false, doc));
-    EXPECT_EQ("abc", XmlUtils::getText(doc.RootElement()->FirstChildElement("uuid"), ""));
-
-    TiXmlDocument fromGzip;
-    ASSERT_TRUE(XmlUtils::load(gzipped(text), true, fromGzip));
-    EXPECT_EQ("abc", XmlUtils::getText(fromGzip.RootElement()->FirstChildElement("uuid"), ""));
-}
-
-TEST_F(XmlUtilsTest, GzippedLoadAcceptsPlainBytes) {
-    ASSERT_TRUE(XmlUtils::load(bytesOf("<a>1</a>"), true, doc));
-    EXPECT_EQ(1, XmlUtils::getValueAsInt(doc.RootElement()));
-}
-
-TEST_F(XmlUtilsTest, LoadReplacesThePreviousDocument) {
-    parse("<first/>");
-    parse("<second/>");
-    EXPECT_EQ(std::string("second"), doc.RootElement()->Value());
-    EXPECT_EQ(nullptr, doc.RootElement()->NextSiblingElement());
+    for (const auto& input : {std::make_pair(bytesOf(text), false), std::make_pair(gzipped(text), true),
+                              std::make_pair(bytesOf(text), true)}) {
+        parse("<first/>");
+        ASSERT_TRUE(XmlUtils::load(input.first, input.second, doc));
+        EXPECT_EQ("abc", XmlUtils::getText(doc.RootElement()->FirstChildElement("uuid"), ""));
+        EXPECT_EQ(nullptr, doc.RootElement()->NextSiblingElement());
+    }
 }
 
 TEST_F(XmlUtilsTest, BrokenOrEmptyDocumentsFail) {
@@ -87,8 +76,9 @@ TEST_F(XmlUtilsTest, BrokenOrEmptyDocumentsFail) {
     EXPECT_FALSE(XmlUtils::load(truncated, true, doc));
 }
 
-TEST_F(XmlUtilsTest, TextGettersFallBackWhenThereIsNoText) {
-    const TiXmlElement* root = parse("<r><n> 42x</n><f>-2.5e1</f><empty/><s>text</s></r>");
+TEST_F(XmlUtilsTest, TextAndAttributeGettersFallBackForMissingOrUnreadableValues) {
+    const TiXmlElement* root =
+        parse("<r s=\"v\" i=\"-12\" f=\"2.5\" bad=\"x\"><n> 42x</n><f>-2.5e1</f><empty/><s>text</s></r>");
     EXPECT_EQ(42, XmlUtils::getValueAsInt(root->FirstChildElement("n")));
     EXPECT_FLOAT_EQ(-25.0f, XmlUtils::getValueAsFloat(root->FirstChildElement("f")));
     EXPECT_EQ(0, XmlUtils::getValueAsInt(root->FirstChildElement("empty")));
@@ -96,6 +86,15 @@ TEST_F(XmlUtilsTest, TextGettersFallBackWhenThereIsNoText) {
     EXPECT_EQ("fallback", XmlUtils::getText(root->FirstChildElement("empty"), "fallback"));
     EXPECT_EQ("fallback", XmlUtils::getText(nullptr, "fallback"));
     EXPECT_EQ("text", XmlUtils::getText(root->FirstChildElement("s"), "fallback"));
+
+    EXPECT_STREQ("v", XmlUtils::getStringAttr(root, "s", "d"));
+    EXPECT_STREQ("d", XmlUtils::getStringAttr(root, "missing", "d"));
+    EXPECT_EQ(-12, XmlUtils::getIntAttr(root, "i", 3));
+    EXPECT_EQ(3, XmlUtils::getIntAttr(root, "missing", 3));
+    EXPECT_EQ(3, XmlUtils::getIntAttr(root, "bad", 3));
+    EXPECT_FLOAT_EQ(2.5f, XmlUtils::getFloatAttr(root, "f", 1.0f));
+    EXPECT_FLOAT_EQ(1.0f, XmlUtils::getFloatAttr(root, "missing", 1.0f));
+    EXPECT_EQ(3, XmlUtils::getIntAttr(nullptr, "i", 3));
 }
 
 TEST_F(XmlUtilsTest, ChildGettersReportMissingChildren) {
@@ -123,18 +122,6 @@ TEST_F(XmlUtilsTest, ChildGettersReportMissingChildren) {
     EXPECT_EQ("old", text);
 }
 
-TEST_F(XmlUtilsTest, AttributeGettersUseDefaultsForAbsentValues) {
-    const TiXmlElement* root = parse("<r s=\"v\" i=\"-12\" f=\"2.5\" bad=\"x\"/>");
-    EXPECT_STREQ("v", XmlUtils::getStringAttr(root, "s", "d"));
-    EXPECT_STREQ("d", XmlUtils::getStringAttr(root, "missing", "d"));
-    EXPECT_EQ(-12, XmlUtils::getIntAttr(root, "i", 3));
-    EXPECT_EQ(3, XmlUtils::getIntAttr(root, "missing", 3));
-    EXPECT_EQ(3, XmlUtils::getIntAttr(root, "bad", 3));
-    EXPECT_FLOAT_EQ(2.5f, XmlUtils::getFloatAttr(root, "f", 1.0f));
-    EXPECT_FLOAT_EQ(1.0f, XmlUtils::getFloatAttr(root, "missing", 1.0f));
-    EXPECT_EQ(3, XmlUtils::getIntAttr(nullptr, "i", 3));
-}
-
 TEST_F(XmlUtilsTest, BoolAttributeTruthTable) {
     const TiXmlElement* root = parse(
         "<r zero=\"0\" f1=\"false\" f2=\"FALSE\" f3=\"fAlSe\" one=\"1\" t=\"true\" no=\"no\" empty=\"\""
@@ -147,39 +134,33 @@ TEST_F(XmlUtilsTest, BoolAttributeTruthTable) {
     }
 }
 
-TEST_F(XmlUtilsTest, WalksCollectionsAndItemsInDocumentOrder) {
+TEST_F(XmlUtilsTest, WalksCollectionsAndItemsInDocumentOrderUntilAHandlerSaysStop) {
     const TiXmlElement* root =
-        parse("<r><other/><hosts id=\"h\"><host>a</host><x>no</x><host>b</host></hosts></r>");
+        parse("<r><other/><hosts id=\"h\"><host>a</host><x>no</x><host>b</host><host>c</host></hosts></r>");
     RecordingHandler handler(false);
     EXPECT_TRUE(XmlUtils::parseTagCollections("hosts", "host", root, handler));
-    EXPECT_EQ((std::vector<std::string>{"collection h", "item a", "item b"}), handler.seen);
+    EXPECT_EQ((std::vector<std::string>{"collection h", "item a", "item b", "item c"}), handler.seen);
+
+    RecordingHandler stopping(false);
+    stopping.stopAt = "b";
+    EXPECT_FALSE(XmlUtils::parseTagCollections("hosts", "host", root, stopping));
+    EXPECT_EQ((std::vector<std::string>{"collection h", "item a", "item b"}), stopping.seen);
 }
 
-TEST_F(XmlUtilsTest, AHandlerReturningFalseStopsTheWalk) {
-    const TiXmlElement* root =
-        parse("<r><hosts id=\"h\"><host>a</host><host>b</host><host>c</host></hosts></r>");
-    RecordingHandler handler(false);
-    handler.stopAt = "b";
-    EXPECT_FALSE(XmlUtils::parseTagCollections("hosts", "host", root, handler));
-    EXPECT_EQ((std::vector<std::string>{"collection h", "item a", "item b"}), handler.seen);
-}
-
-TEST_F(XmlUtilsTest, SingleCollectionHelperRefusesASecondCollection) {
+TEST_F(XmlUtilsTest, SingleCollectionHelperRefusesASecondCollectionAndAcceptsNoneOnlyWhenOptional) {
     const TiXmlElement* root =
         parse("<r><hosts id=\"1\"><host>a</host></hosts><hosts id=\"2\"><host>b</host></hosts></r>");
     RecordingHandler handler(true);
     EXPECT_FALSE(XmlUtils::parseTagCollections("hosts", "host", root, handler));
     EXPECT_EQ((std::vector<std::string>{"collection 1", "item a", "collection 2"}), handler.seen);
     EXPECT_TRUE(hasLogLine("Several <hosts> tags"));
-}
 
-TEST_F(XmlUtilsTest, MissingCollectionIsAcceptedOnlyWhenOptional) {
-    const TiXmlElement* root = parse("<r><host>a</host></r>");
+    root = parse("<r><host>a</host></r>");
     RecordingHandler optional(true);
     EXPECT_TRUE(XmlUtils::parseTagCollections("hosts", "host", root, optional));
+    EXPECT_TRUE(optional.seen.empty());
     RecordingHandler required(false);
     EXPECT_FALSE(XmlUtils::parseTagCollections("hosts", "host", root, required));
-    EXPECT_TRUE(optional.seen.empty());
 }
 
 TEST_F(XmlUtilsTest, NullParentOrElementIsAProgrammingError) {
