@@ -8,11 +8,22 @@
 
 namespace {
 
+typedef boost::shared_ptr<Util::ThreadCallback::Context> Context;
+typedef std::vector<boost::weak_ptr<Util::ThreadCallback::Context> > Watched;
+
 class NumberContext : public Util::ThreadCallback::Context {
 public:
     explicit NumberContext(int number) : number(number) {}
     int number;
 };
+
+std::vector<Context> numberedContexts(int count) {
+    std::vector<Context> contexts;
+    for (int i = 0; i < count; ++i) {
+        contexts.push_back(boost::make_shared<NumberContext>(i));
+    }
+    return contexts;
+}
 
 // Receives the calls and remembers where and with what they ran.
 class Receiver {
@@ -23,7 +34,7 @@ public:
         return Util::ThreadCallback::Function::make<Receiver, &Receiver::onCall>(this);
     }
 
-    void onCall(boost::shared_ptr<Util::ThreadCallback::Context> context) {
+    void onCall(Context context) {
         contexts.push_back(context.get());
         threads.push_back(kdThreadSelf());
         if (destroyOnCall) {
@@ -31,41 +42,43 @@ public:
         }
     }
 
+    // Posts the contexts from a thread of its own; only the posted calls keep them.
+    Watched postFromWorker(std::vector<Context> posted) {
+        const Watched watched(posted.begin(), posted.end());
+        pending.swap(posted);
+        KDThread* worker = kdThreadCreate(nullptr, &Receiver::postPending, this);
+        EXPECT_NE(nullptr, worker);
+        kdThreadJoin(worker, nullptr);
+        return watched;
+    }
+
     boost::scoped_ptr<Util::ThreadCallback> threadCallback;
     std::vector<Util::ThreadCallback::Context*> contexts;
     std::vector<KDThread*> threads;
     bool destroyOnCall = false;
-};
-
-// What a worker thread posts.
-struct Job {
-    Receiver* receiver;
-    std::vector<boost::shared_ptr<Util::ThreadCallback::Context> > contexts;
     KDThread* postedFrom = nullptr;
+
+private:
+    static void* postPending(void* self) {
+        Receiver* receiver = static_cast<Receiver*>(self);
+        receiver->postedFrom = kdThreadSelf();
+        for (const Context& context : receiver->pending) {
+            receiver->threadCallback->asyncPerformIfDifferentThread(receiver->function(), context);
+        }
+        receiver->pending.clear();
+        return nullptr;
+    }
+
+    std::vector<Context> pending;
 };
 
-void* postJob(void* argument) {
-    Job* job = static_cast<Job*>(argument);
-    job->postedFrom = kdThreadSelf();
-    for (size_t i = 0; i < job->contexts.size(); ++i) {
-        job->receiver->threadCallback->asyncPerformIfDifferentThread(job->receiver->function(),
-                                                                     job->contexts[i]);
+bool allExpired(const Watched& watched) {
+    for (const auto& context : watched) {
+        if (!context.expired()) {
+            return false;
+        }
     }
-    return nullptr;
-}
-
-void runOnWorker(Job& job) {
-    KDThread* worker = kdThreadCreate(nullptr, &postJob, &job);
-    ASSERT_NE(nullptr, worker);
-    kdThreadJoin(worker, nullptr);
-}
-
-std::vector<boost::shared_ptr<Util::ThreadCallback::Context> > numberedContexts(int count) {
-    std::vector<boost::shared_ptr<Util::ThreadCallback::Context> > contexts;
-    for (int i = 0; i < count; ++i) {
-        contexts.push_back(boost::make_shared<NumberContext>(i));
-    }
-    return contexts;
+    return true;
 }
 
 class ThreadCallbackTest : public PalTest {};
@@ -74,7 +87,7 @@ class ThreadCallbackTest : public PalTest {};
 
 TEST_F(ThreadCallbackTest, CallOnTheOwnerThreadRunsBeforeReturning) {
     Receiver receiver;
-    boost::shared_ptr<Util::ThreadCallback::Context> context = boost::make_shared<NumberContext>(1);
+    Context context = boost::make_shared<NumberContext>(1);
     receiver.threadCallback->asyncPerformIfDifferentThread(receiver.function(), context);
     ASSERT_EQ(1u, receiver.contexts.size());
     EXPECT_EQ(context.get(), receiver.contexts[0]);
@@ -82,39 +95,31 @@ TEST_F(ThreadCallbackTest, CallOnTheOwnerThreadRunsBeforeReturning) {
     EXPECT_EQ(kdThreadSelf(), receiver.threadCallback->getThread());
 }
 
-TEST_F(ThreadCallbackTest, CallsFromAWorkerRunLaterOnTheOwnerInPostingOrderWithTheirContexts) {
+TEST_F(ThreadCallbackTest, CallsFromAWorkerRunLaterOnTheOwnerInPostingOrderAndReleaseTheirContexts) {
     Receiver receiver;
-    Job job{&receiver, numberedContexts(50)};
-    job.contexts.push_back(boost::shared_ptr<Util::ThreadCallback::Context>());
-    runOnWorker(job);
+    std::vector<Context> posted = numberedContexts(50);
+    posted.push_back(Context());
+    const Watched watched = receiver.postFromWorker(posted);
+    posted.clear();
     EXPECT_TRUE(receiver.contexts.empty());
-    EXPECT_NE(kdThreadSelf(), job.postedFrom);
+    EXPECT_NE(kdThreadSelf(), receiver.postedFrom);
 
     pump();
     ASSERT_EQ(51u, receiver.contexts.size());
     for (int i = 0; i < 50; ++i) {
-        EXPECT_EQ(job.contexts[i].get(), receiver.contexts[i]);
         EXPECT_EQ(i, static_cast<NumberContext*>(receiver.contexts[i])->number);
         EXPECT_EQ(kdThreadSelf(), receiver.threads[i]);
-        // The posted record let go of its reference after the call.
-        EXPECT_EQ(1, job.contexts[i].use_count());
     }
     EXPECT_EQ(nullptr, receiver.contexts[50]);
+    EXPECT_TRUE(allExpired(watched));
 }
 
 TEST_F(ThreadCallbackTest, DestroyedWithCallsQueuedRunsNothingAndFreesTheirContexts) {
     Receiver receiver;
-    Job job{&receiver, numberedContexts(3)};
-    runOnWorker(job);
-    std::vector<boost::weak_ptr<Util::ThreadCallback::Context> > watched(job.contexts.begin(),
-                                                                         job.contexts.end());
-    job.contexts.clear();
+    const Watched watched = receiver.postFromWorker(numberedContexts(3));
     EXPECT_FALSE(watched[0].expired());
-
     receiver.threadCallback.reset();
-    for (size_t i = 0; i < watched.size(); ++i) {
-        EXPECT_TRUE(watched[i].expired());
-    }
+    EXPECT_TRUE(allExpired(watched));
     // A new object at the same address must not receive the old calls.
     receiver.threadCallback.reset(new Util::ThreadCallback());
     pump();
@@ -124,15 +129,9 @@ TEST_F(ThreadCallbackTest, DestroyedWithCallsQueuedRunsNothingAndFreesTheirConte
 TEST_F(ThreadCallbackTest, CallMayDestroyItsThreadCallbackAndTheRestIsDropped) {
     Receiver receiver;
     receiver.destroyOnCall = true;
-    Job job{&receiver, numberedContexts(3)};
-    runOnWorker(job);
-    std::vector<boost::weak_ptr<Util::ThreadCallback::Context> > watched(job.contexts.begin(),
-                                                                         job.contexts.end());
-    job.contexts.clear();
+    const Watched watched = receiver.postFromWorker(numberedContexts(3));
     pump();
     EXPECT_EQ(1u, receiver.contexts.size());
     EXPECT_EQ(nullptr, receiver.threadCallback.get());
-    for (size_t i = 0; i < watched.size(); ++i) {
-        EXPECT_TRUE(watched[i].expired());
-    }
+    EXPECT_TRUE(allExpired(watched));
 }
