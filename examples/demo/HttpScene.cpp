@@ -14,16 +14,6 @@
 #include "network/HttpEngine.h"
 #include "network/HttpRequest.h"
 
-// Debian builds its cpp-httplib with these; the library's types depend on them.
-#ifndef CPPHTTPLIB_OPENSSL_SUPPORT
-#define CPPHTTPLIB_OPENSSL_SUPPORT
-#endif
-#ifndef CPPHTTPLIB_ZLIB_SUPPORT
-#define CPPHTTPLIB_ZLIB_SUPPORT
-#endif
-#ifndef CPPHTTPLIB_BROTLI_SUPPORT
-#define CPPHTTPLIB_BROTLI_SUPPORT
-#endif
 #include <httplib.h>
 
 namespace {
