@@ -4,7 +4,7 @@
 #include <utility>
 #include <vector>
 
-#include "BootedPalTest.h"
+#include "support/PalTest.h"
 
 namespace {
 
@@ -30,10 +30,10 @@ void postUserEvent(int type, void* userptr, intptr_t word0 = 0) {
     kdPostEvent(event);
 }
 
-class EventsTest : public BootedPalTest {
+class EventsTest : public PalTest {
 protected:
     void SetUp() override {
-        BootedPalTest::SetUp();
+        PalTest::SetUp();
         gCalls.clear();
     }
     void TearDown() override {
@@ -42,7 +42,7 @@ protected:
                 kdInstallCallback(nullptr, type, userptr);
             }
         }
-        BootedPalTest::TearDown();
+        PalTest::TearDown();
     }
     int objects[2] = {0, 0};
     void* objectA = &objects[0];
@@ -189,10 +189,10 @@ TEST(ThreadsTest, BackgroundClassIsSetAndRestored) {
 }
 
 // Payloads of events that never reach a callback are released all the same.
-class UndeliveredPayloadTest : public BootedPalTest {
+class UndeliveredPayloadTest : public PalTest {
 protected:
     void SetUp() override {
-        BootedPalTest::SetUp();
+        PalTest::SetUp();
         pal::scriptWifiScan(pal::Answer::after(0), {{"00:11:22:33:44:55", "cafe", -60}});
     }
     // Starts a scan whose answer is queued at once.

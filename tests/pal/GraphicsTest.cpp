@@ -5,7 +5,7 @@
 #include <cstdint>
 #include <vector>
 
-#include "BootedPalTest.h"
+#include "support/PalTest.h"
 
 namespace {
 
@@ -32,10 +32,10 @@ void drawB(KDViewProxyZVR*) {
     ++gCallsB;
 }
 
-class GraphicsTest : public BootedPalTest {
+class GraphicsTest : public PalTest {
 protected:
     void SetUp() override {
-        BootedPalTest::SetUp();
+        PalTest::SetUp();
         gClearColour = {0, 0, 0, 255};
         gCallsA = 0;
         gCallsB = 0;
@@ -44,7 +44,7 @@ protected:
     void TearDown() override {
         kdGFXSetRedrawHandler(&gViewA, nullptr);
         kdGFXSetRedrawHandler(&gViewB, nullptr);
-        BootedPalTest::TearDown();
+        PalTest::TearDown();
     }
 
     static void redrawA() {
@@ -149,7 +149,7 @@ TEST_F(GraphicsTest, AnImpossibleSizeSkipsTheRedrawWithOneLogLineAndAGoodSizeRec
         redrawA();
     }
     EXPECT_EQ(gCallsA, 0);
-    EXPECT_EQ(logLinesWith("graphics unavailable"), 1);
+    EXPECT_EQ(countLogLines("graphics unavailable"), 1);
 
     pal::setContextSize(4, 4);
     redrawA();

@@ -5,7 +5,7 @@
 #include <string>
 #include <vector>
 
-#include "BootedPalTest.h"
+#include "support/PalTest.h"
 
 namespace {
 
@@ -63,10 +63,10 @@ void recordEvent(const KDEvent* event) {
 
 // Records every platform event type (45 pause .. 120 accelerometer) on the test
 // thread, whatever its user pointer.
-class SimulationTest : public BootedPalTest {
+class SimulationTest : public PalTest {
 protected:
     void SetUp() override {
-        BootedPalTest::SetUp();
+        PalTest::SetUp();
         gReceived.clear();
         gReleaseRecords = true;
         installForEveryType(recordEvent);
@@ -74,7 +74,7 @@ protected:
 
     void TearDown() override {
         installForEveryType(nullptr);
-        BootedPalTest::TearDown();
+        PalTest::TearDown();
     }
 
     static void installForEveryType(KDCallbackFunc* callback) {

@@ -1,7 +1,7 @@
 // Timers on the virtual clock: due times, modes and cancellation.
 #include <vector>
 
-#include "BootedPalTest.h"
+#include "support/PalTest.h"
 
 namespace {
 
@@ -25,16 +25,16 @@ void onTimer(const KDEvent* event) {
     }
 }
 
-class TimersTest : public BootedPalTest {
+class TimersTest : public PalTest {
 protected:
     void SetUp() override {
-        BootedPalTest::SetUp();
+        PalTest::SetUp();
         start = kdGetTimeUST();
         kdInstallCallback(onTimer, KD_EVENT_TIMER, nullptr);
     }
     void TearDown() override {
         kdInstallCallback(nullptr, KD_EVENT_TIMER, nullptr);
-        BootedPalTest::TearDown();
+        PalTest::TearDown();
     }
     KDust start = 0;
 };
