@@ -73,11 +73,12 @@ bool PNGImage::decode(png_structp png, png_infop info, IO::InputStream* in) {
     png_set_read_fn(png, in, readFromStream);
     png_set_sig_bytes(png, kSignatureSize);
     png_read_info(png, info);
+    // Asked before the layout is settled, so libpng assembles whole rows.
+    const int passes = png_set_interlace_handling(png);
     if (!prepareLayout(png, info)) {
         return false;
     }
     unsigned char* pixels = data.get() + paletteSize * paletteBitsPerEntry / 8;
-    const int passes = png_set_interlace_handling(png);
     for (int pass = 0; pass < passes; ++pass) {
         for (unsigned row = 0; row < height; ++row) {
             png_read_row(png, pixels + static_cast<size_t>(row) * stride, nullptr);
