@@ -74,12 +74,12 @@ INSTANTIATE_TEST_SUITE_P(
     EveryColourTypeAndDepth, PngDecodingTest,
     ::testing::Values(PngCase{"gray1", 8, false}, PngCase{"gray2", 8, false}, PngCase{"gray4", 8, false},
                       PngCase{"gray8", 8, false}, PngCase{"gray16", 8, false}, PngCase{"palette1", 8, true},
-                      PngCase{"palette2", 8, true}, PngCase{"palette4", 8, true}, PngCase{"palette8", 8, true},
-                      PngCase{"rgb8", 24, false}, PngCase{"rgb16", 24, false}, PngCase{"grayalpha8", 32, false},
-                      PngCase{"grayalpha16", 32, false}, PngCase{"rgba8", 32, false},
-                      PngCase{"rgba16", 32, false}, PngCase{"rgb8-interlaced", 24, false},
-                      PngCase{"palette2-interlaced", 8, true}, PngCase{"gray16-interlaced", 8, false},
-                      PngCase{"grayalpha8-interlaced", 32, false}),
+                      PngCase{"palette2", 8, true}, PngCase{"palette4", 8, true},
+                      PngCase{"palette8", 8, true}, PngCase{"rgb8", 24, false}, PngCase{"rgb16", 24, false},
+                      PngCase{"grayalpha8", 32, false}, PngCase{"grayalpha16", 32, false},
+                      PngCase{"rgba8", 32, false}, PngCase{"rgba16", 32, false},
+                      PngCase{"rgb8-interlaced", 24, false}, PngCase{"palette2-interlaced", 8, true},
+                      PngCase{"gray16-interlaced", 8, false}, PngCase{"grayalpha8-interlaced", 32, false}),
     [](const ::testing::TestParamInfo<PngCase>& info) {
         std::string name = info.param.name;
         return name.replace(name.find('-') == std::string::npos ? name.size() : name.find('-'), 1, "");
@@ -143,10 +143,11 @@ TEST_F(ImageTest, ATruncatedJpegStillDecodesWithAWarningButAnEmptyOneFails) {
 // Every prefix of a file, and the file with each byte in turn damaged, must
 // give an image or nothing, without an assertion or a crash.
 TEST_F(ImageTest, DamagedOrCutFilesGiveAnImageOrNothing) {
-    const char* names[] = {"rgb8-interlaced.png", "palette4.png", "progressive.jpg", "subsampled-restart.jpg"};
+    const char* names[] = {"rgb8-interlaced.png", "palette4.png", "progressive.jpg",
+                           "subsampled-restart.jpg"};
     for (const char* name : names) {
-        const Image::ImageFormat format = std::string(name).find(".png") != std::string::npos ? Image::PNG
-                                                                                               : Image::JPEG;
+        const Image::ImageFormat format =
+            std::string(name).find(".png") != std::string::npos ? Image::PNG : Image::JPEG;
         const Bytes file = readData(name);
         const Bytes whole = dataOf(*decode(file, format));
         for (size_t length = 0; length < file.size(); ++length) {
@@ -163,8 +164,8 @@ TEST_F(ImageTest, DamagedOrCutFilesGiveAnImageOrNothing) {
             damaged[at] ^= 0x5A;
             boost::shared_ptr<Image> image = decode(damaged, format);
             if (image) {
-                EXPECT_EQ(image->getSize(), image->getStride() * image->getHeight() +
-                                                image->getPaletteSize() * 3)
+                EXPECT_EQ(image->getSize(),
+                          image->getStride() * image->getHeight() + image->getPaletteSize() * 3)
                     << name << " damaged at " << at;
             }
         }
@@ -269,10 +270,11 @@ TEST_F(ImageTest, InverseChangesColoursOrPaletteEntriesAndKeepsAlphaAndGray) {
     rgba->inverse();
     const KDuint32 first = Math::Color(200, 30, 90, 255).inverseRGB();
     const KDuint32 second = Math::Color(0, 0, 0, 255).inverseRGB();
-    EXPECT_EQ(dataOf(*rgba), (Bytes{static_cast<unsigned char>(first), static_cast<unsigned char>(first >> 8),
-                                    static_cast<unsigned char>(first >> 16), 17,
-                                    static_cast<unsigned char>(second), static_cast<unsigned char>(second >> 8),
-                                    static_cast<unsigned char>(second >> 16), 255}));
+    EXPECT_EQ(
+        dataOf(*rgba),
+        (Bytes{static_cast<unsigned char>(first), static_cast<unsigned char>(first >> 8),
+               static_cast<unsigned char>(first >> 16), 17, static_cast<unsigned char>(second),
+               static_cast<unsigned char>(second >> 8), static_cast<unsigned char>(second >> 16), 255}));
 
     boost::shared_ptr<Image> gray = Image::createImage({10, 20}, 2, 1, 8);
     gray->inverse();

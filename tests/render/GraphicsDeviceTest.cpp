@@ -1,9 +1,6 @@
 // The fixed-function device on the real GLES 1.1 context: every draw path and
 // state block is checked on the pixels it leaves in the frame.
-#include "render/api/gles1/GraphicsDeviceImpl.h"
-
 #include <algorithm>
-
 #include <boost/make_shared.hpp>
 #include <string>
 #include <tuple>
@@ -14,6 +11,7 @@
 #include "render/api/Texture2D.h"
 #include "render/api/VertexBuffer.h"
 #include "render/api/VertexDeclaration.h"
+#include "render/api/gles1/GraphicsDeviceImpl.h"
 #include "render/api/gles1/ProgramImpl.h"
 #include "render/api/gles1/Texture2DImpl.h"
 
@@ -76,7 +74,10 @@ std::vector<Shape> shapes() {
          vertices({junk, {16, 16}, {48, 16}, {16, 48}, {48, 48}}),
          {{32, 32}, {20, 44}, {44, 20}},
          {{4, 4}, {63, 63}}},
-        {PRIMITIVE_LINES, vertices({junk, {8, 32.5f}, {56, 32.5f}}), {{32, 32}, {10, 32}}, {{32, 20}, {63, 63}}},
+        {PRIMITIVE_LINES,
+         vertices({junk, {8, 32.5f}, {56, 32.5f}}),
+         {{32, 32}, {10, 32}},
+         {{32, 20}, {63, 63}}},
         {PRIMITIVE_LINE_STRIP,
          vertices({junk, {8.5f, 8.5f}, {8.5f, 32.5f}, {32.5f, 32.5f}, {32.5f, 8.5f}}),
          {{8, 20}, {20, 32}, {32, 20}},
@@ -115,7 +116,8 @@ TEST_P(DrawPathTest, DrawsTheShapeWithTheVertexColours) {
         device->setConstant(UniformConstants::UNIFORM_POINT_SIZE, 4.0f);
         device->setVertexDeclaration(decl);
         if (buffers) {
-            device->setVertexBuffer(device->createVertexBuffer(points.size() * sizeof(Vertex), points.data()));
+            device->setVertexBuffer(
+                device->createVertexBuffer(points.size() * sizeof(Vertex), points.data()));
             device->setIndexBuffer(device->createIndexBuffer(indices.size(), indices.data()));
         } else {
             device->setVertexBufferUP(points.data(), points.size() * sizeof(Vertex));
@@ -219,8 +221,11 @@ TEST_F(GraphicsDeviceTest, CullScissorAndViewportLimitWhatIsDrawn) {
         CullMode cull;
         bool clockwise;
         bool drawn;
-    } culls[] = {{CULL_BACK, false, true}, {CULL_BACK, true, false}, {CULL_FRONT, false, false},
-                 {CULL_FRONT, true, true},  {CULL_NONE, true, true}};
+    } culls[] = {{CULL_BACK, false, true},
+                 {CULL_BACK, true, false},
+                 {CULL_FRONT, false, false},
+                 {CULL_FRONT, true, true},
+                 {CULL_NONE, true, true}};
     for (const Case& c : culls) {
         frame([&] {
             useOrtho();
@@ -320,13 +325,15 @@ TEST_F(TextureDrawTest, EveryFormatUploadsAndSamplesItsTexels) {
          {255, 0, 0, 255, 0, 0, 255, 255, 255, 255, 255, 255, 100, 100, 100, 255},
          {red, blue, white, gray}},
         {FORMAT_LUMINANCE, {255, 100, 0, 255}, {white, gray, kBlack, white}},
-        {FORMAT_ALPHA, {255, 100, 0, 255}, {white, Math::Color(255, 255, 255, 100), Math::Color(255, 255, 255, 0), white}},
+        {FORMAT_ALPHA,
+         {255, 100, 0, 255},
+         {white, Math::Color(255, 255, 255, 100), Math::Color(255, 255, 255, 0), white}},
         {FORMAT_PALETTE8_RGB8, palette, {red, blue, white, gray}},
     };
     for (const Case& c : cases) {
         frame([&] {
-            boost::shared_ptr<Texture2D> texture =
-                device->createTexture2D(2, 2, c.format, FILTER_NEAREST, WRAP_CLAMP, WRAP_CLAMP, c.data.data());
+            boost::shared_ptr<Texture2D> texture = device->createTexture2D(
+                2, 2, c.format, FILTER_NEAREST, WRAP_CLAMP, WRAP_CLAMP, c.data.data());
             ASSERT_TRUE(texture);
             EXPECT_EQ(texture->getFormat(), c.format);
             drawTextured(texture);
@@ -399,8 +406,8 @@ TEST_F(TextureDrawTest, FiltersWrapsAndTextureScaleSampleAsAsked) {
         for (size_t i = 0; i < allRed.size(); i += 3) {
             allRed[i] = 255;
         }
-        boost::shared_ptr<Texture2D> mipmapped =
-            device->createTexture2D(8, 8, FORMAT_RGB, FILTER_TRILINEAR, WRAP_CLAMP, WRAP_CLAMP, allRed.data());
+        boost::shared_ptr<Texture2D> mipmapped = device->createTexture2D(
+            8, 8, FORMAT_RGB, FILTER_TRILINEAR, WRAP_CLAMP, WRAP_CLAMP, allRed.data());
         quadVertices.clear();
         drawTextured(mipmapped);
         EXPECT_EQ(pixel(32, 32), red);

@@ -135,6 +135,20 @@ def make_png(name, colour_type, depth, interlaced=False):
         f.write(expected(colour_type, depth, pixels, palette))
 
 
+def make_square_palette():
+    """8 × 4 pixels of 8-bit indices into a four-colour palette: a texture
+    whose sides are powers of two, uploaded in the paletted format."""
+    palette = [(255, 0, 0), (0, 255, 0), (0, 0, 255), (255, 255, 0)]
+    rows = [bytes((x // 2 + y) % 4 for x in range(8)) for y in range(4)]
+    png = b"\x89PNG\r\n\x1a\n"
+    png += chunk(b"IHDR", struct.pack(">IIBBBBB", 8, 4, 8, 3, 0, 0, 0))
+    png += chunk(b"PLTE", b"".join(bytes(entry) for entry in palette))
+    png += chunk(b"IDAT", zlib.compress(filter_rows(rows, 1), 9))
+    png += chunk(b"IEND", b"")
+    with open("palette-square.png", "wb") as f:
+        f.write(png)
+
+
 def make_jpegs():
     w, h = 24, 16
     rgb = bytearray()
@@ -169,4 +183,5 @@ make_png("rgb8-interlaced", 2, 8, True)
 make_png("palette2-interlaced", 3, 2, True)
 make_png("gray16-interlaced", 0, 16, True)
 make_png("grayalpha8-interlaced", 4, 8, True)
+make_square_palette()
 make_jpegs()
