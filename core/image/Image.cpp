@@ -123,7 +123,10 @@ bool Image::allocate(unsigned newWidth, unsigned newHeight, unsigned newBitsPerP
     paletteSize = newPaletteSize;
     paletteBitsPerEntry = newPaletteBitsPerEntry;
     if (getSize() != 0) {
-        data.reset(new unsigned char[getSize()]());
+        // Decoders write every row; only the palette, which files may fill in
+        // part, starts zeroed.
+        data.reset(new unsigned char[getSize()]);
+        std::memset(data.get(), 0, newPaletteSize * newPaletteBitsPerEntry / 8);
     }
     return true;
 }

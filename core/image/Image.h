@@ -64,8 +64,8 @@ protected:
     // Reads the image from in; false when it cannot. Image itself reads nothing.
     virtual bool init(IO::InputStream* in);
 
-    // Sets the layout and allocates data for it, zero-filled (no array when
-    // the size is 0); false, leaving the image empty, when a side is above
+    // Sets the layout and allocates data for it, with a zeroed palette (no
+    // array when the size is 0); false, leaving the image empty, when a side is above
     // kMaxSide or the bits per pixel are not whole bytes up to 32.
     bool allocate(unsigned newWidth, unsigned newHeight, unsigned newBitsPerPixel, unsigned newPaletteSize,
                   unsigned newPaletteBitsPerEntry);
