@@ -95,10 +95,11 @@ bool JPGImage::init(IO::InputStream* in) {
     jpeg_decompress_struct cinfo;
     ErrorManager errors;
     zavrin_jpeg_source_mgr source;
+    // Zeroed, so that destroying is safe whatever step jumped back.
+    std::memset(&cinfo, 0, sizeof(cinfo));
     cinfo.err = jpeg_std_error(&errors.base);
     errors.base.error_exit = errorExit;
     errors.base.output_message = outputMessage;
-    jpeg_create_decompress(&cinfo);
     source.base.init_source = initSource;
     source.base.fill_input_buffer = fillInputBuffer;
     source.base.skip_input_data = skipInputData;
@@ -108,11 +109,12 @@ bool JPGImage::init(IO::InputStream* in) {
     source.base.next_input_byte = nullptr;
     source.in = in;
     source.startOfFile = true;
-    cinfo.src = &source.base;
 
     // Set only on the path without a jump back.
     volatile bool decoded = false;
     if (setjmp(errors.jump) == 0) {
+        jpeg_create_decompress(&cinfo);
+        cinfo.src = &source.base;
         decoded = decode(&cinfo);
     }
     jpeg_destroy_decompress(&cinfo);
