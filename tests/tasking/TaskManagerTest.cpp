@@ -234,9 +234,9 @@ TEST_F(TaskManagerTest, SchedulingATaskSomeManagerStillHoldsIsRefusedAndChangesN
             manager->schedule(task, 0);
         }
     };
-    pumpUntil([&task] { return task->finishedCount == 2; });
+    pumpUntil([&task] { return task->finishedCount >= 2; });
     other->schedule(task, 0);
-    pumpUntil([&task] { return task->finishedCount == 3; });
+    pumpUntil([&task] { return task->finishedCount >= 3; });
     EXPECT_EQ((Names{"gate", "task", "gate", "task", "task"}), journal.read("run"));
     EXPECT_NE(running->runThread, task->runThread);
 }
