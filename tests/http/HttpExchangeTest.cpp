@@ -210,6 +210,7 @@ TEST_F(HttpExchangeTest, RedirectsAreFollowedOnlyWhenAsked) {
     EXPECT_EQ((std::vector<std::string>{"response", "finished"}), conditional.events);
     EXPECT_EQ(0, conditional.code);
     EXPECT_EQ(304, conditional.status());
+    ASSERT_NE(nullptr, conditional.response);
     EXPECT_EQ("\"v1\"", conditional.response->getHeader("ETag"));
     int targetRequests = 0;
     for (const TestHttpServer::Received& received : server->received()) {

@@ -122,6 +122,7 @@ TEST_F(HttpFailureTest, RepeatedLengthsThatAgreeAreAccepted) {
 
     EXPECT_EQ(0, recorder->code);
     EXPECT_EQ("abc", recorder->body);
+    ASSERT_NE(nullptr, recorder->response);
     EXPECT_EQ(3, recorder->response->getContentLength());
 }
 
@@ -139,11 +140,12 @@ TEST_F(HttpFailureTest, HeadBytesTricklingInKeepTheConnectionAliveButSilenceInsi
     std::unique_ptr<Recorder> slow = fetch(slowPeer.url(), 500);
     std::unique_ptr<Recorder> stalled = fetch(stalledPeer.url(), 300);
 
-    EXPECT_EQ(0, slow->code);
-    EXPECT_EQ("ok", slow->body);
-    EXPECT_EQ(std::string(40, 'p'), slow->response->getHeader("X-Padding"));
     EXPECT_EQ((std::vector<std::string>{"finished"}), stalled->events);
     EXPECT_EQ(Network::HTTP_TIMEOUT_ERROR_CODE, stalled->code);
+    EXPECT_EQ(0, slow->code);
+    EXPECT_EQ("ok", slow->body);
+    ASSERT_NE(nullptr, slow->response);
+    EXPECT_EQ(std::string(40, 'p'), slow->response->getHeader("X-Padding"));
 }
 
 TEST_F(HttpFailureTest, OfflineAtStartFinishesWithOfflineCodeWithoutTraffic) {
