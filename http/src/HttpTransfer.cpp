@@ -315,7 +315,8 @@ void HttpTransfer::complete(CURLcode result) {
         // libcurl takes a close inside the head for the end of a bodiless
         // answer; without its blank line the head is cut short.
         if (!responseDelivered && !skippingBlock) {
-            fail(HTTP_BAD_RESPONSE_ERROR_CODE);
+            kdLogFormatMessage("HttpConnection %d: the answer ended inside its head", id);
+            finish(HTTP_BAD_RESPONSE_ERROR_CODE);
             return;
         }
         finish(HTTP_FINISHED_OK);

@@ -17,6 +17,17 @@ std::string patternBody(std::size_t size) {
     return body;
 }
 
+// Notes how much body a recorder had when a posted event of its thread ran.
+struct BodyMark {
+    const Recorder* recorder;
+    std::size_t bodySize;
+
+    static void onEvent(const KDEvent* event) {
+        BodyMark* mark = static_cast<BodyMark*>(event->userptr);
+        mark->bodySize = mark->recorder->body.size();
+    }
+};
+
 boost::shared_ptr<HttpRequest> request(const std::string& url, const char* method, bool follow = false) {
     return HttpRequest::create(url.c_str(), method, 10000, follow);
 }
@@ -234,8 +245,18 @@ TEST_F(HttpExchangeTest, PartsWaitingForASlowCallerHoldTheTransferBack) {
     // Not a timing expectation: however long the caller stays away, no more
     // is taken in.
     EXPECT_FALSE(waitUnpumped([&] { return waiting() > bound + oneRead; }, std::chrono::milliseconds(2500)));
+    // An event of the thread's own, queued behind the parts waiting now, runs
+    // before the parts that come after them.
+    BodyMark mark = {&recorder, 0};
+    kdInstallCallback(&BodyMark::onEvent, KD_EVENT_USER, &mark);
+    KDEvent* event = kdCreateEvent();
+    event->type = KD_EVENT_USER;
+    event->userptr = &mark;
+    kdPostEvent(event);
     ASSERT_TRUE(waitFor([&] { return recorder.finished(); }));
+    kdInstallCallback(nullptr, KD_EVENT_USER, &mark);
 
     EXPECT_EQ(0, recorder.code);
     EXPECT_TRUE(recorder.body == body);
+    EXPECT_LE(static_cast<long long>(mark.bodySize), bound + oneRead);
 }
