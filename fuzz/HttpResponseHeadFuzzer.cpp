@@ -4,19 +4,13 @@
 // a number or -1.
 #include <cstddef>
 #include <cstdint>
-#include <cstdio>
-#include <cstdlib>
 
 #include "../http/src/HttpResponseHead.h"
+#include "FuzzSupport.h"
+
+using fuzz::check;
 
 namespace {
-
-void check(bool holds, const char* promise) {
-    if (!holds) {
-        std::fprintf(stderr, "mapcore fuzz: broken promise: %s\n", promise);
-        std::abort();
-    }
-}
 
 void checkHead(const Network::HttpResponseHead& head) {
     const Network::HttpResponse response = head.toResponse();
