@@ -1,0 +1,128 @@
+#include "location/LocationManager.h"
+
+#include <algorithm>
+#include <boost/make_shared.hpp>
+
+#include "lifecycle/PauseResumeHandler.h"
+#include "location/LocationProviderGPS.h"
+
+namespace Location {
+
+namespace {
+
+Location initialLocation() {
+    Location location(RawLocation::unknown);
+    location.speedXY = -1;
+    location.bearingXY = -1.0f;
+    location.accuracyXY = -1;
+    return location;
+}
+
+}  // namespace
+
+LocationManager::LocationManager()
+    : locationProviderGPS(new LocationProviderGPS(this)),
+      pauseResumeListenerWrapper(boost::make_shared<Lifecycle::PauseResumeListenerWrapper>(this)),
+      lastLocation(initialLocation()),
+      precision(PrecisionNone),
+      isPaused(true) {
+    Lifecycle::PauseResumeHandler* handler = Lifecycle::PauseResumeHandler::getInstance();
+    KD_ASSERT(handler != nullptr);
+    if (handler != nullptr) {
+        handler->addListener(pauseResumeListenerWrapper);
+        isPaused = handler->getIsAppPaused();
+    }
+    if (!isPaused) {
+        resume();
+    }
+}
+
+LocationManager::~LocationManager() {
+    Lifecycle::PauseResumeHandler* handler = Lifecycle::PauseResumeHandler::getInstance();
+    if (handler != nullptr) {
+        handler->removeListener(pauseResumeListenerWrapper.get());
+    }
+}
+
+void LocationManager::addLocationListener(LocationListener* listener) {
+    KD_ASSERT(find(listeners.begin(), listeners.end(), listener) == listeners.end());
+    if (!isListening(listener)) {
+        listeners.push_back(listener);
+    }
+}
+
+void LocationManager::removeLocationListener(LocationListener* listener) {
+    std::vector<LocationListener*>::iterator it = std::find(listeners.begin(), listeners.end(), listener);
+    if (it != listeners.end()) {
+        listeners.erase(it);
+    }
+}
+
+bool LocationManager::isListening(const LocationListener* listener) const {
+    return std::find(listeners.begin(), listeners.end(), listener) != listeners.end();
+}
+
+void LocationManager::setSimulator(Simulator::AbstractSimulator* simulator) {
+    locationProviderGPS->setSimulator(simulator);
+}
+
+bool LocationManager::isOwnProvider(const LocationProvider* provider) const {
+    return provider == locationProviderGPS.get();
+}
+
+void LocationManager::resume() {
+    isPaused = false;
+    locationProviderGPS->enable();
+}
+
+bool LocationManager::onResumed() {
+    KD_ASSERT(isPaused);
+    resume();
+    return true;
+}
+
+bool LocationManager::onPaused() {
+    KD_ASSERT(!isPaused);
+    isPaused = true;
+    locationProviderGPS->disable();
+    return true;
+}
+
+void LocationManager::onProviderLocationChanged(LocationProvider* provider, const Location& location) {
+    KD_ASSERT(isOwnProvider(provider));
+    lastLocation = location;
+    // A snapshot, and each listener checked again: one listener may remove
+    // (and destroy) another while being told.
+    const std::vector<LocationListener*> snapshot = listeners;
+    for (size_t i = 0; i < snapshot.size(); ++i) {
+        if (isListening(snapshot[i])) {
+            snapshot[i]->onLocationChanged(this, location);
+        }
+    }
+}
+
+void LocationManager::onProviderStatusChanged(LocationProvider* provider, ProviderStatus, ProviderStatus) {
+    KD_ASSERT(isOwnProvider(provider));
+}
+
+void LocationManager::onProviderPrecisionChanged(LocationProvider* provider, LocationPrecision,
+                                                 LocationPrecision newPrecision) {
+    KD_ASSERT(isOwnProvider(provider));
+    setPrecision(newPrecision);
+}
+
+void LocationManager::setPrecision(LocationPrecision newPrecision) {
+    const LocationPrecision oldPrecision = precision;
+    precision = newPrecision;
+    if (oldPrecision == newPrecision) {
+        return;
+    }
+    const std::vector<LocationListener*> snapshot = listeners;
+    for (size_t i = 0; i < snapshot.size(); ++i) {
+        if (isListening(snapshot[i])) {
+            snapshot[i]->onLocationPrecisionChanged(this, oldPrecision, newPrecision);
+        }
+    }
+}
+
+}  // namespace Location
