@@ -1,7 +1,6 @@
 #include "location/LocationProviderGPS.h"
 
 #include "location/AbstractSimulator.h"
-#include "util/Logger.h"
 
 namespace Location {
 
@@ -86,11 +85,11 @@ void LocationProviderGPS::onLocationEvent(const KDEvent* e) {
     const bool simulated = e->timestamp == static_cast<KDust>(-1);
     RawLocation raw = {fix.latitude, fix.longitude, fix.speed,       fix.bearing,   fix.accuracy,
                        fix.altitude, static_cast<LocationPrecision>(fix.precision), 0, kdGetTimeUST()};
+    // Fixes without a usable position, accuracy or precision go silently.
     if (!raw.sanitize()) {
-        Logger::log(Logger::Warning, "LocationProviderGPS: unusable fix dropped");
         return;
     }
-    if (!admit(fix, simulated)) {
+    if (!admit(raw, simulated)) {
         return;
     }
     Location location(raw);
@@ -108,7 +107,7 @@ void LocationProviderGPS::onLocationEvent(const KDEvent* e) {
     reportNewLocation(result);
 }
 
-bool LocationProviderGPS::admit(const KDLocationFixZVR& fix, bool simulated) {
+bool LocationProviderGPS::admit(const RawLocation& fix, bool simulated) {
     if (simulator == nullptr) {
         return !simulated;
     }

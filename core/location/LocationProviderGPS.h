@@ -34,7 +34,7 @@ private:
     void onLocationEvent(const KDEvent* e);
     void onStatusEvent(const KDEvent* e);
     // Whether a fix passes the simulator's replay and record hooks.
-    bool admit(const KDLocationFixZVR& fix, bool simulated);
+    bool admit(const RawLocation& fix, bool simulated);
 
     boost::scoped_ptr<LocationFilterAverage> filter;
     Simulator::AbstractSimulator* simulator;
