@@ -275,15 +275,15 @@ bool GpxReader::readFile(const char* path, std::vector<GpxPoint>& points, std::s
         error = std::string("cannot open ") + path;
         return false;
     }
-    std::vector<unsigned char> bytes;
-    unsigned char buffer[16384];
-    int count = 0;
-    while ((count = stream->read(buffer, sizeof(buffer))) > 0) {
-        bytes.insert(bytes.end(), buffer, buffer + count);
-        if (bytes.size() > kMaxBytes) {
-            error = "file too large";
-            return false;
-        }
+    const long long size = stream->available();
+    if (size < 0 || size > static_cast<long long>(kMaxBytes)) {
+        error = std::string("cannot read ") + path;
+        return false;
+    }
+    std::vector<unsigned char> bytes(static_cast<size_t>(size));
+    if (size > 0 && stream->read(bytes.data(), static_cast<int>(size)) != size) {
+        error = std::string("cannot read ") + path;
+        return false;
     }
     return parse(bytes, points, error);
 }
