@@ -5,6 +5,7 @@
 
 #include "lifecycle/PauseResumeHandler.h"
 #include "location/LocationProviderGPS.h"
+#include "location/LocationProviderWireless.h"
 
 namespace Location {
 
@@ -22,6 +23,7 @@ Location initialLocation() {
 
 LocationManager::LocationManager()
     : locationProviderGPS(new LocationProviderGPS(this)),
+      locationProviderWireless(new LocationProviderWireless(this)),
       pauseResumeListenerWrapper(boost::make_shared<Lifecycle::PauseResumeListenerWrapper>(this)),
       lastLocation(initialLocation()),
       precision(PrecisionNone),
@@ -66,13 +68,15 @@ void LocationManager::setSimulator(Simulator::AbstractSimulator* simulator) {
     locationProviderGPS->setSimulator(simulator);
 }
 
-bool LocationManager::isOwnProvider(const LocationProvider* provider) const {
-    return provider == locationProviderGPS.get();
+bool LocationManager::checkProvider(const LocationProvider* provider) const {
+    KD_ASSERT(provider == locationProviderGPS.get() || provider == locationProviderWireless.get());
+    return provider == locationProviderGPS.get() || provider == locationProviderWireless.get();
 }
 
 void LocationManager::resume() {
     isPaused = false;
     locationProviderGPS->enable();
+    locationProviderWireless->enable();
 }
 
 bool LocationManager::onResumed() {
@@ -85,11 +89,17 @@ bool LocationManager::onPaused() {
     KD_ASSERT(!isPaused);
     isPaused = true;
     locationProviderGPS->disable();
+    locationProviderWireless->disable();
     return true;
 }
 
 void LocationManager::onProviderLocationChanged(LocationProvider* provider, const Location& location) {
-    KD_ASSERT(isOwnProvider(provider));
+    if (!checkProvider(provider)) {
+        return;
+    }
+    if (provider == locationProviderGPS.get()) {
+        locationProviderWireless->disable();
+    }
     lastLocation = location;
     // A snapshot, and each listener checked again: one listener may remove
     // (and destroy) another while being told.
@@ -101,13 +111,23 @@ void LocationManager::onProviderLocationChanged(LocationProvider* provider, cons
     }
 }
 
-void LocationManager::onProviderStatusChanged(LocationProvider* provider, ProviderStatus, ProviderStatus) {
-    KD_ASSERT(isOwnProvider(provider));
+// Losing the satellite fix (or the receiver) hands over to network
+// positioning, whose first answer is asked for at once.
+void LocationManager::onProviderStatusChanged(LocationProvider* provider, ProviderStatus, ProviderStatus newStatus) {
+    if (!checkProvider(provider) || provider != locationProviderGPS.get() || newStatus == StatusAvailable || isPaused) {
+        return;
+    }
+    locationProviderWireless->enable();
+    setPrecision(locationProviderWireless->getPrecision());
 }
 
+// A network precision does not override a satellite provider that has a fix.
 void LocationManager::onProviderPrecisionChanged(LocationProvider* provider, LocationPrecision,
                                                  LocationPrecision newPrecision) {
-    KD_ASSERT(isOwnProvider(provider));
+    if (!checkProvider(provider) ||
+        (provider == locationProviderWireless.get() && locationProviderGPS->getStatus() == StatusAvailable)) {
+        return;
+    }
     setPrecision(newPrecision);
 }
 

@@ -17,6 +17,7 @@ class AbstractSimulator;
 namespace Location {
 
 class LocationProviderGPS;
+class LocationProviderWireless;
 
 // The one stream of positions for the application: satellite fixes through
 // the filter chain, with network positioning filling in while there is no
@@ -54,12 +55,14 @@ private:
     LocationManager();
 
     void resume();
-    bool isOwnProvider(const LocationProvider* provider) const;
+    // Asserts when provider is not one of ours.
+    bool checkProvider(const LocationProvider* provider) const;
     void setPrecision(LocationPrecision newPrecision);
     bool isListening(const LocationListener* listener) const;
 
     std::vector<LocationListener*> listeners;
     boost::scoped_ptr<LocationProviderGPS> locationProviderGPS;
+    boost::scoped_ptr<LocationProviderWireless> locationProviderWireless;
     boost::shared_ptr<Lifecycle::PauseResumeListenerWrapper> pauseResumeListenerWrapper;
     Location lastLocation;
     LocationPrecision precision;

@@ -28,11 +28,13 @@ bool RawLocation::sanitize() {
     if (!isFinite(altitude)) {
         altitude = -1.0f;
     }
-    const bool positionUsable = isFinite(latitude) && isFinite(longitude) && kdFabsf(latitude) <= 90.0f &&
-                                kdFabsf(longitude) <= 180.0f;
     const bool accuracyUsable = isFinite(accuracy) && accuracy >= 0.0f;
     const bool precisionKnown = precision == PrecisionNetwork || precision == PrecisionSatellite;
-    return positionUsable && accuracyUsable && precisionKnown;
+    return hasUsablePosition() && accuracyUsable && precisionKnown;
+}
+
+bool RawLocation::hasUsablePosition() const {
+    return isFinite(latitude) && isFinite(longitude) && kdFabsf(latitude) <= 90.0f && kdFabsf(longitude) <= 180.0f;
 }
 
 }  // namespace Location

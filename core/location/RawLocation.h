@@ -33,6 +33,8 @@ struct RawLocation {
     // is not finite or lies outside +-90 / +-180, an accuracy that is not a
     // finite non-negative number, or a precision outside the known values.
     bool sanitize();
+    // Latitude and longitude finite and within +-90 / +-180.
+    bool hasUsablePosition() const;
 };
 
 }  // namespace Location
