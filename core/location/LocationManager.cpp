@@ -99,6 +99,9 @@ void LocationManager::onProviderLocationChanged(LocationProvider* provider, cons
     }
     if (provider == locationProviderGPS.get()) {
         locationProviderWireless->disable();
+        // Back from network positioning, the overall precision is the
+        // satellite provider's again.
+        setPrecision(locationProviderGPS->getPrecision());
     }
     lastLocation = location;
     // A snapshot, and each listener checked again: one listener may remove
