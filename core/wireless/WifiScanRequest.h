@@ -16,7 +16,7 @@ public:
     typedef WifiScanRequestImpl::Callback Callback;
 
     // How long the platform gets to answer.
-    static const long long kScanTimeoutNs = 3000000000LL;
+    static constexpr long long kScanTimeoutNs = 3000000000LL;
 
     WifiScanRequest();
     ~WifiScanRequest();

@@ -58,14 +58,17 @@ int NetworkTaskImpl::takeNextId() {
 }
 
 void NetworkTaskImpl::schedule(long long time, KDThread* thread) {
-    KD_ASSERT(connection.get() == nullptr);
+    KD_ASSERT(connection.get() == __null);
     creationTime = time;
     callerThread = thread;
     priority = task->getPriority();
-    boost::shared_ptr<Util::ThreadCallback::Context> context =
-        boost::make_shared<ScheduleContext>(boost::weak_ptr<NetworkTaskImpl>(shared_from_this()));
+    if (kdThreadSelf() == callerThread) {
+        priorityManager->start(shared_from_this());
+        return;
+    }
     threadCallback->asyncPerformIfDifferentThread(
-        Util::ThreadCallback::Function::make<NetworkTaskImpl, &NetworkTaskImpl::doSchedule>(this), context);
+        Util::ThreadCallback::Function::make<NetworkTaskImpl, &NetworkTaskImpl::doSchedule>(this),
+        boost::make_shared<ScheduleContext>(boost::weak_ptr<NetworkTaskImpl>(shared_from_this())));
 }
 
 void NetworkTaskImpl::doSchedule(boost::shared_ptr<Util::ThreadCallback::Context> context) {
