@@ -28,7 +28,8 @@ LocationFilterAverage::LocationFilterAverage() : lastX(0), lastY(0) {
 Location LocationFilterAverage::filter(const Location& location) {
     if (location.accuracy >= 0.0f && location.precision == PrecisionSatellite) {
         const bool hasLast = lastX != 0 && lastY != 0;
-        if (hasLast && CoordConversion::getDistance(lastX, lastY, location.x, location.y) >= kResetDistanceMetres) {
+        if (hasLast &&
+            CoordConversion::getDistance(lastX, lastY, location.x, location.y) >= kResetDistanceMetres) {
             reset();
         }
         lastX = location.x;

@@ -7,9 +7,9 @@ namespace Location {
 
 namespace {
 
-const float kFastSpeed = 2.7777779f;     // 10 km/h
-const float kMovingSpeed = 1.3888890f;   // 5 km/h
-const float kBearingAccuracy = 50.0f;    // metres
+const float kFastSpeed = 2.7777779f;    // 10 km/h
+const float kMovingSpeed = 1.3888890f;  // 5 km/h
+const float kBearingAccuracy = 50.0f;   // metres
 const KDtime kFastMemorySeconds = 600;
 const float kMaxGateMetres = 75.0f;
 

@@ -116,8 +116,10 @@ void LocationManager::onProviderLocationChanged(LocationProvider* provider, cons
 
 // Losing the satellite fix (or the receiver) hands over to network
 // positioning, whose first answer is asked for at once.
-void LocationManager::onProviderStatusChanged(LocationProvider* provider, ProviderStatus, ProviderStatus newStatus) {
-    if (!checkProvider(provider) || provider != locationProviderGPS.get() || newStatus == StatusAvailable || isPaused) {
+void LocationManager::onProviderStatusChanged(LocationProvider* provider, ProviderStatus,
+                                              ProviderStatus newStatus) {
+    if (!checkProvider(provider) || provider != locationProviderGPS.get() || newStatus == StatusAvailable ||
+        isPaused) {
         return;
     }
     locationProviderWireless->enable();

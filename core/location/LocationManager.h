@@ -43,7 +43,8 @@ public:
 
     // Reports of the owned providers.
     void onProviderLocationChanged(LocationProvider* provider, const Location& location);
-    void onProviderStatusChanged(LocationProvider* provider, ProviderStatus oldStatus, ProviderStatus newStatus);
+    void onProviderStatusChanged(LocationProvider* provider, ProviderStatus oldStatus,
+                                 ProviderStatus newStatus);
     void onProviderPrecisionChanged(LocationProvider* provider, LocationPrecision oldPrecision,
                                     LocationPrecision newPrecision);
 

@@ -24,9 +24,10 @@ void LocationProvider::setStatus(ProviderStatus newStatus) {
 // follow a lost satellite fix and would never show satellite level.
 void LocationProvider::changePrecision(LocationPrecision newPrecision) {
     if (!isReporting()) {
-        Logger::log(Logger::Error,
-                    "LocationProvider::changePrecision: %s: Precision change reported in an incorrect state (%d)",
-                    name.c_str(), static_cast<int>(status));
+        Logger::log(
+            Logger::Error,
+            "LocationProvider::changePrecision: %s: Precision change reported in an incorrect state (%d)",
+            name.c_str(), static_cast<int>(status));
         return;
     }
     const LocationPrecision oldPrecision = precision;

@@ -83,8 +83,15 @@ void LocationProviderGPS::onLocationEvent(const KDEvent* e) {
         return;
     }
     const bool simulated = e->timestamp == static_cast<KDust>(-1);
-    RawLocation raw = {fix.latitude, fix.longitude, fix.speed,       fix.bearing,   fix.accuracy,
-                       fix.altitude, static_cast<LocationPrecision>(fix.precision), 0, kdGetTimeUST()};
+    RawLocation raw = {fix.latitude,
+                       fix.longitude,
+                       fix.speed,
+                       fix.bearing,
+                       fix.accuracy,
+                       fix.altitude,
+                       static_cast<LocationPrecision>(fix.precision),
+                       0,
+                       kdGetTimeUST()};
     // Fixes without a usable position, accuracy or precision go silently.
     if (!raw.sanitize()) {
         return;
@@ -115,8 +122,8 @@ bool LocationProviderGPS::admit(const RawLocation& fix, bool simulated) {
         return false;
     }
     if (simulator->isRecording()) {
-        simulator->recordLocation(fix.latitude, fix.longitude, fix.speed, fix.bearing, fix.accuracy, fix.altitude,
-                                  fix.precision);
+        simulator->recordLocation(fix.latitude, fix.longitude, fix.speed, fix.bearing, fix.accuracy,
+                                  fix.altitude, fix.precision);
     }
     return true;
 }

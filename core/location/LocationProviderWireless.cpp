@@ -61,7 +61,8 @@ void LocationProviderWireless::onTimerEvent() {
                     LocationProviderWireless, &LocationProviderWireless::onLbsNetworkRequestCompleted>(this));
 }
 
-void LocationProviderWireless::onLbsNetworkRequestCompleted(const Wireless::LbsNetworkRequest::Response& response) {
+void LocationProviderWireless::onLbsNetworkRequestCompleted(
+    const Wireless::LbsNetworkRequest::Response& response) {
     if (response.error != 0) {
         return;
     }

@@ -34,7 +34,8 @@ bool RawLocation::sanitize() {
 }
 
 bool RawLocation::hasUsablePosition() const {
-    return isFinite(latitude) && isFinite(longitude) && kdFabsf(latitude) <= 90.0f && kdFabsf(longitude) <= 180.0f;
+    return isFinite(latitude) && isFinite(longitude) && kdFabsf(latitude) <= 90.0f &&
+           kdFabsf(longitude) <= 180.0f;
 }
 
 }  // namespace Location

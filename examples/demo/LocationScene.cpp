@@ -1,10 +1,11 @@
 // Location: a short drive replayed from a GPX file (examples/demo/data,
-// written by make_tunnel_drive.py) as simulated satellite fixes, ten times
+// written by make_tunnel_drive.py) as simulated satellite fixes, fifteen times
 // faster than driven. In the tunnel the receiver loses its fix; the location
 // manager hands over to network positioning, which asks a positioning server
 // on loopback with the simulated Wi-Fi and cell; out of the tunnel the
 // satellite fixes take over again. Every handover and every filtered position
 // the application would see is printed.
+#include <httplib.h>
 #include <pal/Simulation.h>
 
 #include <cstdio>
@@ -20,13 +21,11 @@
 #include "startup/StartupData.h"
 #include "util/Timer.h"
 
-#include <httplib.h>
-
 namespace {
 
 using Location::LocationManager;
 
-const float kReplayRate = 10.0f;
+const float kReplayRate = 15.0f;
 // Where the server places the phone from its cell and Wi-Fi: in the tunnel.
 const char kPositionAnswer[] =
     "<location><coordinates latitude=\"48.13505\" longitude=\"11.58660\" accuracy=\"120\"/></location>";
@@ -70,7 +69,8 @@ public:
             finished();
             return;
         }
-        demo::say("positioning server on 127.0.0.1:%d; track %s: %zu points", port, path.c_str(), points.size());
+        demo::say("positioning server on 127.0.0.1:%d; track %s: %zu points", port, path.c_str(),
+                  points.size());
         configureDevice();
         player.reset(new Simulator::GpxPlayer(points, kReplayRate));
         manager = LocationManager::getInstance();
@@ -92,14 +92,15 @@ public:
 
     void onLocationPrecisionChanged(LocationManager*, Location::LocationPrecision oldPrecision,
                                     Location::LocationPrecision newPrecision) override {
-        demo::say("  handover: overall precision %s -> %s", precisionName(oldPrecision), precisionName(newPrecision));
+        demo::say("  handover: overall precision %s -> %s", precisionName(oldPrecision),
+                  precisionName(newPrecision));
     }
 
 private:
     bool startServer() {
         server.Get("/cellid_location/", [](const httplib::Request& request, httplib::Response& response) {
-            demo::say("  server: positioning request with %zu parameters (wifinetworks=%s)", request.params.size(),
-                      request.get_param_value("wifinetworks").c_str());
+            demo::say("  server: positioning request with %zu parameters (wifinetworks=%s)",
+                      request.params.size(), request.get_param_value("wifinetworks").c_str());
             response.set_content(kPositionAnswer, "text/xml");
         });
         port = server.bind_to_any_port("127.0.0.1");
@@ -109,7 +110,8 @@ private:
         return port > 0;
     }
 
-    static bool readTrack(const std::string& path, std::vector<Simulator::GpxPoint>& points, std::string& error) {
+    static bool readTrack(const std::string& path, std::vector<Simulator::GpxPoint>& points,
+                          std::string& error) {
         std::unique_ptr<FILE, int (*)(FILE*)> file(std::fopen(path.c_str(), "rb"), &std::fclose);
         if (!file) {
             error = "cannot open " + path;
@@ -130,19 +132,20 @@ private:
         startup->setHost(Startup::StartupData::HOST_CELLID, "http://127.0.0.1:" + std::to_string(port) + "/");
         startup->uuid = "demo-client";
         startup->startupReady = true;
-        pal::scriptWifiScan(pal::Answer::after(50 * 1000000ull),
-                            {{"00:1a:2b:3c:4d:5e", "tunnel-cafe", -71}, {"00:1a:2b:3c:4d:5f", "tunnel-guest", -80}});
+        pal::scriptWifiScan(
+            pal::Answer::after(50 * 1000000ull),
+            {{"00:1a:2b:3c:4d:5e", "tunnel-cafe", -71}, {"00:1a:2b:3c:4d:5f", "tunnel-guest", -80}});
         pal::scriptCellInfo(pal::Answer::after(20 * 1000000ull), {true, 23011, 4021, "26201", "262"});
         pal::scriptSignalStrength(pal::Answer::after(10 * 1000000ull), true, -85);
     }
 
     void onTrackEnd() {
-        demo::say("track replayed: %d positions reached the application", positions);
-        // Let the last fix pass through the event loop first.
+        // The last fix is still on its way through the event loop.
         finishTimer.start(Util::Timer::OneShot, 100 * 1000000ll);
     }
 
     void finish() {
+        demo::say("track replayed: %d positions reached the application", positions);
         detach();
         finished();
     }

@@ -23,14 +23,16 @@ std::vector<unsigned char> bytesOf(const std::string& text) {
 }
 
 std::string track(const std::string& points) {
-    return "<?xml version=\"1.0\"?><gpx version=\"1.1\" xmlns=\"http://www.topografix.com/GPX/1/1\"><trk><trkseg>" +
+    return "<?xml version=\"1.0\"?><gpx version=\"1.1\" "
+           "xmlns=\"http://www.topografix.com/GPX/1/1\"><trk><trkseg>" +
            points + "</trkseg></trk></gpx>";
 }
 
 TEST(GpxReaderTest, ReadsATrackWrittenByPython) {
     std::ifstream file(MAPCORE_LOCATION_DATA "/python-track.gpx", std::ios::binary);
     ASSERT_TRUE(file.good());
-    const std::vector<unsigned char> bytes((std::istreambuf_iterator<char>(file)), std::istreambuf_iterator<char>());
+    const std::vector<unsigned char> bytes((std::istreambuf_iterator<char>(file)),
+                                           std::istreambuf_iterator<char>());
     std::vector<GpxPoint> points;
     std::string error;
     ASSERT_TRUE(GpxReader::parse(bytes, points, error)) << error;
@@ -167,10 +169,8 @@ TEST_F(GpxPlayerTest, PlaysFixesOnTheTrackTimesAndReportsGapsAsLostFixes) {
     EXPECT_EQ(1, finishedCalls);
     // At rate 2: fixes at 0, 0.75 s; lost 1.5 s later; found with the fix at 5.75 s.
     const Delivery expected[] = {
-        {0, KD_EVENT_LOCATION_ZVR, 1.0f, -1},
-        {750, KD_EVENT_LOCATION_ZVR, 2.0f, -1},
-        {2250, KD_EVENT_LOCATION_STATUS_ZVR, 0.0f, 1},
-        {5750, KD_EVENT_LOCATION_STATUS_ZVR, 0.0f, 2},
+        {0, KD_EVENT_LOCATION_ZVR, 1.0f, -1},          {750, KD_EVENT_LOCATION_ZVR, 2.0f, -1},
+        {2250, KD_EVENT_LOCATION_STATUS_ZVR, 0.0f, 1}, {5750, KD_EVENT_LOCATION_STATUS_ZVR, 0.0f, 2},
         {5750, KD_EVENT_LOCATION_ZVR, 3.0f, -1},
     };
     ASSERT_EQ(5u, heard.size());
@@ -233,7 +233,8 @@ TEST_F(GpxDriveTest, RecordedDriveReplaysAsTheSameFixes) {
         advanceMs(intervalsMs[i]);
         const float speed = i % 3 == 0 ? -1.0f : 11.5f + 0.1f * i;
         const float bearing = i % 4 == 0 ? -1.0f : 44.0f + i;
-        pal::injectLocationFix({47.0f + 0.000076f * i, 8.0f + 0.000112f * i, speed, bearing, 6.0f + i, 400.0f + i, 2});
+        pal::injectLocationFix(
+            {47.0f + 0.000076f * i, 8.0f + 0.000112f * i, speed, bearing, 6.0f + i, 400.0f + i, 2});
         pump();
     }
     ASSERT_EQ(12u, recorder.getPoints().size());

@@ -1,13 +1,13 @@
 #include <gtest/gtest.h>
 
-#include "location/LocationTestSupport.h"
-#include "support/PalTest.h"
 #include "location/LocationFilterAverage.h"
 #include "location/LocationFilterAverageCourse.h"
 #include "location/LocationFilterGenerateCourse.h"
 #include "location/LocationFilterGenerateSpeed.h"
 #include "location/LocationFilterKalman.h"
 #include "location/LocationFilterMinDistance.h"
+#include "location/LocationTestSupport.h"
+#include "support/PalTest.h"
 
 namespace {
 
@@ -27,7 +27,7 @@ float jitter(int i, int salt) {
 class LocationFilterTest : public PalTest {
 protected:
     Fix fix(float north, float east, int second, float speed = -1.0f, float bearing = -1.0f,
-                 float accuracy = 20.0f) {
+            float accuracy = 20.0f) {
         return fixNear(kLat, kLon, north, east, accuracy, second * kSecond, speed, bearing);
     }
 };
@@ -112,7 +112,8 @@ TEST_F(LocationFilterTest, SpeedStaysWhenTimeDoesNotMoveForward) {
 
 TEST_F(LocationFilterTest, NetworkAndDroppedFixesDoNotTouchTheChain) {
     Location::LocationFilterAverage chain;
-    const Fix network = fixNear(kLat, kLon, 400, 0, 150.0f, kSecond, -1.0f, -1.0f, Location::PrecisionNetwork);
+    const Fix network =
+        fixNear(kLat, kLon, 400, 0, 150.0f, kSecond, -1.0f, -1.0f, Location::PrecisionNetwork);
     const Fix passed = chain.filter(network);
     EXPECT_EQ(network.latitude, passed.latitude);
     EXPECT_EQ(network.x, passed.x);
@@ -148,7 +149,8 @@ TEST_F(LocationFilterTest, CourseWithoutFixBearingsComesFromTheTrack) {
     struct Heading {
         float north, east, course;
     };
-    for (const Heading& heading : {Heading{1, 0, 0}, Heading{0, 1, 90}, Heading{-1, 0, 180}, Heading{0, -1, 270}}) {
+    for (const Heading& heading :
+         {Heading{1, 0, 0}, Heading{0, 1, 90}, Heading{-1, 0, 180}, Heading{0, -1, 270}}) {
         Location::LocationFilterGenerateCourse course;
         Fix out;
         for (int i = 0; i < 4; ++i) {

@@ -17,7 +17,8 @@ namespace {
 
 using Location::LocationManager;
 
-const char kAnswer[] = "<location><coordinates latitude=\"48.1372\" longitude=\"11.5756\" accuracy=\"150\"/></location>";
+const char kAnswer[] =
+    "<location><coordinates latitude=\"48.1372\" longitude=\"11.5756\" accuracy=\"150\"/></location>";
 
 class Positions : public Location::LocationListener {
 public:

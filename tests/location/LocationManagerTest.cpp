@@ -1,5 +1,3 @@
-#include "location/LocationManager.h"
-
 #include <KD/kdext.h>
 #include <gtest/gtest.h>
 #include <pal/Simulation.h>
@@ -8,6 +6,7 @@
 #include <vector>
 
 #include "location/AbstractSimulator.h"
+#include "location/LocationManager.h"
 #include "location/LocationProvider.h"
 #include "support/PalTest.h"
 
@@ -131,10 +130,10 @@ TEST_F(LocationManagerTest, PauseStopsTheReceiverUntilResume) {
 
 TEST_F(LocationManagerTest, UnusableFixesNeverReachListeners) {
     const KDLocationFixZVR bad[] = {
-        {kNaN, 11.0f, 1.0f, 0.0f, 10.0f, 0.0f, 2},    {48.0f, kNaN, 1.0f, 0.0f, 10.0f, 0.0f, 2},
-        {91.0f, 11.0f, 1.0f, 0.0f, 10.0f, 0.0f, 2},   {48.0f, 181.0f, 1.0f, 0.0f, 10.0f, 0.0f, 2},
-        {48.0f, 11.0f, 1.0f, 0.0f, -1.0f, 0.0f, 2},   {48.0f, 11.0f, 1.0f, 0.0f, kNaN, 0.0f, 2},
-        {48.0f, 11.0f, 1.0f, 0.0f, 10.0f, 0.0f, 0},   {48.0f, 11.0f, 1.0f, 0.0f, 10.0f, 0.0f, -3},
+        {kNaN, 11.0f, 1.0f, 0.0f, 10.0f, 0.0f, 2},  {48.0f, kNaN, 1.0f, 0.0f, 10.0f, 0.0f, 2},
+        {91.0f, 11.0f, 1.0f, 0.0f, 10.0f, 0.0f, 2}, {48.0f, 181.0f, 1.0f, 0.0f, 10.0f, 0.0f, 2},
+        {48.0f, 11.0f, 1.0f, 0.0f, -1.0f, 0.0f, 2}, {48.0f, 11.0f, 1.0f, 0.0f, kNaN, 0.0f, 2},
+        {48.0f, 11.0f, 1.0f, 0.0f, 10.0f, 0.0f, 0}, {48.0f, 11.0f, 1.0f, 0.0f, 10.0f, 0.0f, -3},
     };
     for (const KDLocationFixZVR& fix : bad) {
         deliver(fix);
@@ -198,8 +197,9 @@ public:
 TEST_F(LocationManagerTest, ReportsOfADisabledProviderAreLoggedAndDropped) {
     IdleProvider idle(manager);
     idle.report();
-    EXPECT_TRUE(hasLogLine("LocationProvider::changePrecision: Idle: Precision change reported in an incorrect "
-                           "state (0)"));
+    EXPECT_TRUE(
+        hasLogLine("LocationProvider::changePrecision: Idle: Precision change reported in an incorrect "
+                   "state (0)"));
     EXPECT_TRUE(
         hasLogLine("LocationProvider::reportNewLocation: Idle: Location reported in an incorrect state (0)"));
     EXPECT_TRUE(heard.locations.empty());

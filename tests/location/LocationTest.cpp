@@ -1,9 +1,8 @@
-#include "location/Location.h"
-
 #include <gtest/gtest.h>
 
 #include <limits>
 
+#include "location/Location.h"
 #include "math/CoordConversion.h"
 
 namespace {
@@ -79,8 +78,15 @@ TEST(LocationTest, SanitizeRejectsUnusablePositionsAndClearsImpossibleOptionalVa
         {"infinite altitude", 52.0f, 13.0f, 3.0f, 90.0f, 5.0f, -kInf, 2, true, 3.0f, 90.0f, -1.0f},
     };
     for (const SanitizeCase& c : cases) {
-        RawLocation raw = {c.latitude, c.longitude, c.speed, c.bearing, c.accuracy, c.altitude,
-                           static_cast<Location::LocationPrecision>(c.precision), 0, 0};
+        RawLocation raw = {c.latitude,
+                           c.longitude,
+                           c.speed,
+                           c.bearing,
+                           c.accuracy,
+                           c.altitude,
+                           static_cast<Location::LocationPrecision>(c.precision),
+                           0,
+                           0};
         EXPECT_EQ(c.usable, raw.sanitize()) << c.name;
         EXPECT_EQ(c.speedAfter, raw.speed) << c.name;
         EXPECT_EQ(c.bearingAfter, raw.bearing) << c.name;

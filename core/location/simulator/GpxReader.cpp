@@ -235,7 +235,8 @@ bool readPoints(const TiXmlElement* gpx, std::vector<GpxPoint>& points, std::str
 
 }  // namespace
 
-bool GpxReader::parse(const std::vector<unsigned char>& bytes, std::vector<GpxPoint>& points, std::string& error) {
+bool GpxReader::parse(const std::vector<unsigned char>& bytes, std::vector<GpxPoint>& points,
+                      std::string& error) {
     points.clear();
     if (bytes.size() > kMaxBytes) {
         error = "file too large";

@@ -23,7 +23,8 @@ public:
     static const size_t kMaxPoints = 200000;
 
     // True with the points, or false with an error and no points.
-    static bool parse(const std::vector<unsigned char>& bytes, std::vector<GpxPoint>& points, std::string& error);
+    static bool parse(const std::vector<unsigned char>& bytes, std::vector<GpxPoint>& points,
+                      std::string& error);
     // Reads a file through the platform's file system ("/data/drive.gpx").
     static bool readFile(const char* path, std::vector<GpxPoint>& points, std::string& error);
 };

@@ -46,7 +46,8 @@ void appendPoint(std::string& out, const GpxPoint& point) {
     if (point.accuracy >= 0.0f) {
         appendValue(out, "          <mapcore:accuracy>%.9g</mapcore:accuracy>\n", point.accuracy);
     }
-    std::snprintf(text, sizeof(text), "          <mapcore:precision>%d</mapcore:precision>\n", point.precision);
+    std::snprintf(text, sizeof(text), "          <mapcore:precision>%d</mapcore:precision>\n",
+                  point.precision);
     out += text;
     out += "        </extensions>\n";
     out += "      </trkpt>\n";
@@ -60,8 +61,8 @@ GpxRecorder::GpxRecorder()
 void GpxRecorder::recordLocation(float latitude, float longitude, float speed, float bearing, float accuracy,
                                  float altitude, int precision) {
     const KDint64 elapsedMs = static_cast<KDint64>((kdGetTimeUST() - startUst) / 1000000);
-    const GpxPoint point = {latitude, longitude, altitude, speed, bearing, accuracy, precision,
-                            startWallMs + elapsedMs};
+    const GpxPoint point = {latitude, longitude, altitude,  speed,
+                            bearing,  accuracy,  precision, startWallMs + elapsedMs};
     points.push_back(point);
 }
 

@@ -110,13 +110,12 @@ int daysInMonth(int year, int month) {
 bool parse(const std::string& text, KDint64& millisecondsSinceEpoch) {
     size_t pos = 0;
     int year = 0, month = 0, day = 0, hour = 0, minute = 0, second = 0, milliseconds = 0, offsetMinutes = 0;
-    const bool wellFormed = readDigits(text, pos, 4, year) && expect(text, pos, '-') &&
-                            readDigits(text, pos, 2, month) && expect(text, pos, '-') &&
-                            readDigits(text, pos, 2, day) && expect(text, pos, 'T') &&
-                            readDigits(text, pos, 2, hour) && expect(text, pos, ':') &&
-                            readDigits(text, pos, 2, minute) && expect(text, pos, ':') &&
-                            readDigits(text, pos, 2, second) && readFraction(text, pos, milliseconds) &&
-                            readOffset(text, pos, offsetMinutes) && pos == text.size();
+    const bool wellFormed =
+        readDigits(text, pos, 4, year) && expect(text, pos, '-') && readDigits(text, pos, 2, month) &&
+        expect(text, pos, '-') && readDigits(text, pos, 2, day) && expect(text, pos, 'T') &&
+        readDigits(text, pos, 2, hour) && expect(text, pos, ':') && readDigits(text, pos, 2, minute) &&
+        expect(text, pos, ':') && readDigits(text, pos, 2, second) && readFraction(text, pos, milliseconds) &&
+        readOffset(text, pos, offsetMinutes) && pos == text.size();
     if (!wellFormed || month < 1 || month > 12 || day < 1 || day > daysInMonth(year, month) || hour > 23 ||
         minute > 59 || second > 60) {
         return false;
@@ -139,8 +138,8 @@ std::string format(KDint64 millisecondsSinceEpoch) {
     int day = 0;
     civilFromDays(days, year, month, day);
     char text[64];
-    std::snprintf(text, sizeof(text), "%04lld-%02d-%02dT%02d:%02d:%02d.%03dZ", static_cast<long long>(year), month,
-                  day, static_cast<int>(msOfDay / 3600000), static_cast<int>(msOfDay / 60000 % 60),
+    std::snprintf(text, sizeof(text), "%04lld-%02d-%02dT%02d:%02d:%02d.%03dZ", static_cast<long long>(year),
+                  month, day, static_cast<int>(msOfDay / 3600000), static_cast<int>(msOfDay / 60000 % 60),
                   static_cast<int>(msOfDay / 1000 % 60), static_cast<int>(msOfDay % 1000));
     return text;
 }
