@@ -182,7 +182,7 @@ TEST_F(GpxPlayerTest, PlaysFixesOnTheTrackTimesAndReportsGapsAsLostFixes) {
     }
 }
 
-TEST_F(GpxPlayerTest, StoppedPlayerPostsNothingMore) {
+TEST_F(GpxPlayerTest, StoppedOrEmptyPlayersPostNothingMore) {
     const std::vector<GpxPoint> points(5, GpxPoint{1.0f, 2.0f, -1.0f, -1.0f, -1.0f, 5.0f, 2, -1});
     Simulator::GpxPlayer player(points);
     player.start();
@@ -191,7 +191,13 @@ TEST_F(GpxPlayerTest, StoppedPlayerPostsNothingMore) {
     player.stop();
     advanceMs(10000);
     EXPECT_EQ(2u, heard.size());
-    EXPECT_EQ(0, finishedCalls);
+
+    Simulator::GpxPlayer empty({});
+    empty.start(Simulator::GpxPlayer::Finished::make<GpxPlayerTest, &GpxPlayerTest::onFinished>(this));
+    EXPECT_FALSE(empty.isPlaying());
+    EXPECT_EQ(1, finishedCalls);
+    advanceMs(10000);
+    EXPECT_EQ(2u, heard.size());
 }
 
 // Records what the provider admits while another simulator decides replay.

@@ -51,8 +51,12 @@ void GpxPlayer::start(Finished finished) {
     stop();
     onFinished = finished;
     next = 0;
-    started = true;
     fixLost = false;
+    if (points.empty()) {
+        onFinished();
+        return;
+    }
+    started = true;
     playPoint();
 }
 
@@ -62,10 +66,12 @@ void GpxPlayer::stop() {
 }
 
 KDint64 GpxPlayer::gapAfter(size_t index) const {
-    if (points[index].timeMs < 0) {
+    if (points[index].timeMs < 0 || points[index + 1].timeMs < 0) {
         return kDefaultIntervalMs;
     }
-    return points[index + 1].timeMs - points[index].timeMs;
+    // Points that were not read from a file may go back in time; they follow at once.
+    const KDint64 gap = points[index + 1].timeMs - points[index].timeMs;
+    return gap > 0 ? gap : 0;
 }
 
 void GpxPlayer::onTimer() {
