@@ -5,6 +5,7 @@
 #include <chrono>
 #include <functional>
 #include <string>
+#include <thread>
 #include <vector>
 
 #include "location/LocationManager.h"
@@ -66,13 +67,17 @@ protected:
         PalTest::TearDown();
     }
 
+    // Pumps until condition holds or the generous real-time bound runs out.
+    // It polls: the server's side posts nothing to this thread, and on the
+    // virtual clock a wait for an event would not end by itself.
     bool waitFor(const std::function<bool()>& condition) {
-        const auto end = std::chrono::steady_clock::now() + std::chrono::seconds(10);
+        const auto end = std::chrono::steady_clock::now() + std::chrono::seconds(20);
         while (!condition()) {
             if (std::chrono::steady_clock::now() >= end) {
                 return false;
             }
-            kdWaitEvent(5 * 1000 * 1000);
+            pump();
+            std::this_thread::sleep_for(std::chrono::milliseconds(1));
         }
         return true;
     }
