@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "io/BufferInputStream.h"
+#include "util/Logger.h"
 #include "io/zip/impl/StoredZipInputStream.h"
 #include "io/zip/impl/UncachedZipInputStream.h"
 
@@ -13,6 +14,9 @@ namespace IO {
 namespace Zip {
 
 namespace {
+
+// Deflate's densest form carries about 1032 output bytes per input byte.
+const unsigned long long kMaxDeflateRatio = 1032;
 
 InputStream* asStream(voidpf stream) {
     return static_cast<InputStream*>(stream);
@@ -100,6 +104,7 @@ bool ZipFile::open(boost::shared_ptr<InputStream> archive) {
     KD_ASSERT(!file);
     index = boost::make_shared<const ZipEntryMap>();
     stream = archive;
+    archiveSize = stream->tell() + stream->available();
     functions.zopen64_file = &ZipFile::openFile;
     functions.zread_file = &ZipFile::readFile;
     functions.zwrite_file = &ZipFile::writeFile;
@@ -142,12 +147,33 @@ bool ZipFile::buildIndex() {
 }
 
 bool ZipFile::readCurrentEntry(ZipEntry& entry) {
-    // Sizes first, then every text at its full length: a fixed name buffer would cut long names
-    // and leave them unterminated.
+    // Most entries fit these buffers and are read in one call; a longer name, extra field or
+    // any comment is read again at its full length (a cut name would be unterminated).
     unz_file_info64 info;
-    if (unzGetCurrentFileInfo64(file, &info, nullptr, 0, nullptr, 0, nullptr, 0) != UNZ_OK) {
+    char name[256];
+    unsigned char extra[64];
+    if (unzGetCurrentFileInfo64(file, &info, name, sizeof(name), extra, sizeof(extra), nullptr, 0) != UNZ_OK) {
         return false;
     }
+    if (info.size_filename < sizeof(name) && info.size_file_extra <= sizeof(extra) && info.size_file_comment == 0) {
+        entry.name.assign(name, info.size_filename);
+        entry.extra.assign(extra, extra + info.size_file_extra);
+    } else if (!readCurrentTexts(entry, info)) {
+        return false;
+    }
+    entry.compressed = info.compression_method != 0;
+    entry.compressedSize = static_cast<unsigned int>(info.compressed_size);
+    entry.uncompressedSize = static_cast<unsigned int>(info.uncompressed_size);
+    unz64_file_pos position;
+    if (unzGetFilePos64(file, &position) != UNZ_OK) {
+        return false;
+    }
+    entry.directoryPosition = position.pos_in_zip_directory;
+    entry.entryNumber = position.num_of_file;
+    return true;
+}
+
+bool ZipFile::readCurrentTexts(ZipEntry& entry, unz_file_info64& info) {
     std::vector<char> name(info.size_filename + 1);
     entry.extra.resize(info.size_file_extra);
     std::vector<char> comment(info.size_file_comment + 1);
@@ -157,15 +183,7 @@ bool ZipFile::readCurrentEntry(ZipEntry& entry) {
     }
     entry.name.assign(name.data(), info.size_filename);
     entry.comment.assign(comment.data(), info.size_file_comment);
-    entry.compressed = info.compression_method != 0;
-    entry.compressedSize = static_cast<unsigned int>(info.compressed_size);
-    entry.uncompressedSize = static_cast<unsigned int>(info.uncompressed_size);
-
-    if (unzOpenCurrentFile(file) != UNZ_OK) {
-        return false;
-    }
-    entry.dataOffset = static_cast<long long>(unzGetCurrentFileZStreamPos64(file));
-    return unzCloseCurrentFile(file) == UNZ_OK;
+    return true;
 }
 
 const ZipEntry* ZipFile::findEntry(const std::string& name) const {
@@ -178,13 +196,15 @@ boost::shared_ptr<InputStream> ZipFile::getInputStream(const ZipEntry& entry, bo
         KD_ASSERT(false);
         return boost::shared_ptr<InputStream>();
     }
-    if (!entry.compressed) {
-        return boost::shared_ptr<InputStream>(
-            new StoredZipInputStream(shared_from_this(), stream, entry.dataOffset, entry.uncompressedSize));
-    }
-    if (unzLocateFile(file, entry.name.c_str(), 1) != UNZ_OK) {
+    long long dataOffset = 0;
+    if (!openCurrent(entry, dataOffset)) {
         KD_ASSERT(false);
         return boost::shared_ptr<InputStream>();
+    }
+    if (!entry.compressed) {
+        unzCloseCurrentFile(file);
+        return boost::shared_ptr<InputStream>(
+            new StoredZipInputStream(shared_from_this(), stream, dataOffset, entry.uncompressedSize));
     }
     if (cached) {
         return inflateWhole(entry);
@@ -192,12 +212,37 @@ boost::shared_ptr<InputStream> ZipFile::getInputStream(const ZipEntry& entry, bo
     return boost::shared_ptr<InputStream>(new UncachedZipInputStream(shared_from_this(), entry));
 }
 
-boost::shared_ptr<InputStream> ZipFile::inflateWhole(const ZipEntry& entry) {
-    if (entry.uncompressedSize > INT_MAX || unzOpenCurrentFile(file) != UNZ_OK) {
-        KD_ASSERT(false);
-        return boost::shared_ptr<InputStream>();
+bool ZipFile::openCurrent(const ZipEntry& entry, long long& dataOffset) {
+    unz64_file_pos position = {entry.directoryPosition, entry.entryNumber};
+    // A stored entry is read through a window of the archive; only where its data begins is
+    // wanted, so it is opened raw.
+    if (unzGoToFilePos64(file, &position) != UNZ_OK ||
+        unzOpenCurrentFile2(file, nullptr, nullptr, entry.compressed ? 0 : 1) != UNZ_OK) {
+        return false;
     }
-    unsigned char* bytes = new (std::nothrow) unsigned char[entry.uncompressedSize];
+    dataOffset = static_cast<long long>(unzGetCurrentFileZStreamPos64(file));
+    if (claimsFit(entry, dataOffset)) {
+        return true;
+    }
+    Logger::log(Logger::Error, "ZipFile: entry %s claims more data than the archive holds", entry.name.c_str());
+    unzCloseCurrentFile(file);
+    return false;
+}
+
+bool ZipFile::claimsFit(const ZipEntry& entry, long long dataOffset) const {
+    // Sizes from the directory are claims: nothing is sized from them unless the archive could
+    // hold that much.
+    if (dataOffset < 0 || dataOffset > archiveSize || entry.compressedSize > archiveSize - dataOffset) {
+        return false;
+    }
+    if (!entry.compressed) {
+        return entry.compressedSize == entry.uncompressedSize;
+    }
+    return entry.uncompressedSize <= kMaxDeflateRatio * entry.compressedSize;
+}
+
+boost::shared_ptr<InputStream> ZipFile::inflateWhole(const ZipEntry& entry) {
+    unsigned char* bytes = entry.uncompressedSize <= INT_MAX ? new (std::nothrow) unsigned char[entry.uncompressedSize] : nullptr;
     int count = bytes ? unzReadCurrentFile(file, bytes, entry.uncompressedSize) : -1;
     // Closing checks the CRC. A short or damaged entry must not be handed out: the caller
     // would read uninitialised or corrupt bytes as the resource.

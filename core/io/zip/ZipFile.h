@@ -37,7 +37,8 @@ public:
 
     // A stored entry comes as a window of the archive stream whatever cached says; a compressed
     // one either inflated whole into memory (cached) or inflated while read (uncached, one at a
-    // time per zip file). Empty, with an assertion failure, when the entry cannot be opened.
+    // time per zip file). Empty, with an assertion failure, when the entry cannot be opened or its
+    // sizes claim more than the archive can hold. Goes straight to the entry's directory record.
     boost::shared_ptr<InputStream> getInputStream(const ZipEntry& entry, bool cached);
 
 private:
@@ -46,6 +47,12 @@ private:
     bool open(boost::shared_ptr<InputStream> archive);
     bool buildIndex();
     bool readCurrentEntry(ZipEntry& entry);
+    bool readCurrentTexts(ZipEntry& entry, unz_file_info64& info);
+    // Makes entry minizip's current entry and opens it; false when it cannot be opened or claims
+    // more than the archive holds.
+    bool openCurrent(const ZipEntry& entry, long long& dataOffset);
+    bool claimsFit(const ZipEntry& entry, long long dataOffset) const;
+    // Reads the open current entry whole and closes it.
     boost::shared_ptr<InputStream> inflateWhole(const ZipEntry& entry);
 
     static voidpf ZCALLBACK openFile(voidpf opaque, const void* filename, int mode);
@@ -59,6 +66,7 @@ private:
     // Uncached entry streams open now (0 or 1): such a stream owns minizip's current entry.
     int openStreams = 0;
     boost::shared_ptr<InputStream> stream;
+    long long archiveSize = 0;
     unzFile file = nullptr;
     zlib_filefunc64_def functions;
     boost::shared_ptr<const ZipEntryMap> index;
