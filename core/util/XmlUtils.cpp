@@ -199,8 +199,9 @@ bool XmlUtils::load(IO::InputStream* stream, TiXmlDocument& doc) {
     // keeps every such step inside the buffer and ends the parse there.
     const int kTerminatorPadding = 8;
     const long long left = stream->available();
-    const int size = left <= 0 ? 0 : (left >= INT_MAX - kTerminatorPadding ? INT_MAX - kTerminatorPadding
-                                                                            : static_cast<int>(left));
+    const int size = left <= 0 ? 0
+                               : (left >= INT_MAX - kTerminatorPadding ? INT_MAX - kTerminatorPadding
+                                                                       : static_cast<int>(left));
     std::vector<char> text(static_cast<size_t>(size) + kTerminatorPadding, '\0');
     const int got = size > 0 ? stream->read(text.data(), size) : 0;
     text[got > 0 ? got : 0] = '\0';

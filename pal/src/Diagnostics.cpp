@@ -91,7 +91,9 @@ void kdHandleAssertion(const KDchar* condition, const KDchar* filename, KDint li
 #endif
 }
 
-void kdLogMessage(const KDchar* string) { pal::detail::writeLogLine(string != nullptr ? string : ""); }
+void kdLogMessage(const KDchar* string) {
+    pal::detail::writeLogLine(string != nullptr ? string : "");
+}
 
 void kdLogFormatMessage(const KDchar* format, ...) {
     va_list ap;

@@ -1,8 +1,8 @@
 #include <pal/Simulation.h>
 
 #include <algorithm>
-#include <filesystem>
 #include <boost/make_shared.hpp>
+#include <filesystem>
 
 #include "IoTest.h"
 #include "io/FileManager.h"

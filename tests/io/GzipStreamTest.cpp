@@ -150,11 +150,13 @@ TEST_F(GzipStreamTest, DamagedCompressedDataFailsInsteadOfPassingThrough) {
         return bytes;
     };
     const Bytes cases[] = {
-        damaged(gzipped, gzipped.size() - 8, static_cast<unsigned char>(~gzipped[gzipped.size() - 8])),  // CRC
-        damaged(gzipped, gzipped.size() - 1, 0xff),                                                       // size
-        damaged(gzipped, gzipped.size() / 2, static_cast<unsigned char>(~gzipped[gzipped.size() / 2])),  // block
-        damaged(gzipped, 10, 0xff),                            // block type
-        damaged(zlibbed, zlibbed.size() - 1, 0x00),            // Adler-32
+        damaged(gzipped, gzipped.size() - 8,
+                static_cast<unsigned char>(~gzipped[gzipped.size() - 8])),  // CRC
+        damaged(gzipped, gzipped.size() - 1, 0xff),                         // size
+        damaged(gzipped, gzipped.size() / 2,
+                static_cast<unsigned char>(~gzipped[gzipped.size() / 2])),  // block
+        damaged(gzipped, 10, 0xff),                                         // block type
+        damaged(zlibbed, zlibbed.size() - 1, 0x00),                         // Adler-32
         damaged(zlibbed, zlibbed.size() / 2, static_cast<unsigned char>(~zlibbed[zlibbed.size() / 2])),
     };
     for (const Bytes& input : cases) {

@@ -9,11 +9,11 @@
 #include "io/Exception.h"
 #include "io/FileInputStream.h"
 #include "io/WrappedInputStream.h"
-#include "io/zip/GzipInputStream.h"
 #include "io/resource/BlockInputStream.h"
 #include "io/resource/PackageBuilder.h"
 #include "io/resource/ResBlockInputStream.h"
 #include "io/resource/ResourceFile.h"
+#include "io/zip/GzipInputStream.h"
 #include "io/zip/ZipOutputStream.h"
 
 namespace {
@@ -235,7 +235,8 @@ TEST_F(ResourceFileTest, ASplitResourceWhosePartsDoNotHoldItsClaimDoesNotOpen) {
     EXPECT_EQ(1, countLogLines(claims));
 
     // 4 GiB in blocks of one byte, and 2 GiB in blocks of 16: nothing is sized from the claim.
-    for (const Bytes& extra : {Bytes{0xff, 0xff, 0xff, 0xff, 1, 0, 0, 0}, Bytes{0, 0, 0, 0x80, 16, 0, 0, 0}}) {
+    for (const Bytes& extra :
+         {Bytes{0xff, 0xff, 0xff, 0xff, 1, 0, 0, 0}, Bytes{0, 0, 0, 0x80, 16, 0, 0, 0}}) {
         package = boost::make_shared<IO::ByteArrayOutputStream>();
         writeDamagedPackage(extra, true);
         clearLog();
@@ -244,7 +245,8 @@ TEST_F(ResourceFileTest, ASplitResourceWhosePartsDoNotHoldItsClaimDoesNotOpen) {
     }
 
     // Every part there, but one shorter or longer than the claim says.
-    for (const Bytes& extra : {Bytes{0xE7, 0x03, 0, 0, 0x90, 0x01, 0, 0}, Bytes{0xE8, 0x03, 0, 0, 0x91, 0x01, 0, 0}}) {
+    for (const Bytes& extra :
+         {Bytes{0xE7, 0x03, 0, 0, 0x90, 0x01, 0, 0}, Bytes{0xE8, 0x03, 0, 0, 0x91, 0x01, 0, 0}}) {
         package = boost::make_shared<IO::ByteArrayOutputStream>();
         writeDamagedPackage(extra, true);
         clearLog();
@@ -283,8 +285,8 @@ TEST_F(ResourceFileTest, APackageMadeByTheZipCommandReadsBack) {
     for (auto expected : {std::make_pair("maps/big.bin", big), std::make_pair("text.txt", text)}) {
         boost::shared_ptr<IO::FileInputStream> again = boost::make_shared<IO::FileInputStream>();
         ASSERT_TRUE(again->init("/pkg.zip"));
-        boost::shared_ptr<IO::InputStream> stream = boost::make_shared<ResourceFile>(again)->openInputStream(
-            expected.first, packed);
+        boost::shared_ptr<IO::InputStream> stream =
+            boost::make_shared<ResourceFile>(again)->openInputStream(expected.first, packed);
         ASSERT_TRUE(stream) << expected.first;
         EXPECT_EQ(expected.second, readAll(*stream)) << expected.first;
     }

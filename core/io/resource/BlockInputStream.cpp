@@ -57,7 +57,8 @@ int BlockInputStream::readFromBlock(unsigned char* buffer, unsigned int length) 
     current->seek(offset, KD_SEEK_SET);
     // A block longer than the block size must not lend its extra bytes to the next block's
     // positions.
-    long long n = std::min<long long>({current->available(), static_cast<long long>(blockSize - offset), length});
+    long long n =
+        std::min<long long>({current->available(), static_cast<long long>(blockSize - offset), length});
     if (n <= 0) {
         return 0;
     }

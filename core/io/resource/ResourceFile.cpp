@@ -33,7 +33,8 @@ boost::shared_ptr<FileSystem> ResourceFile::createFileSystem(boost::shared_ptr<I
     }
     if (foreign > 0) {
         // Ordinary zip tools add fields of their own (timestamps, owners) to every entry.
-        Logger::log(Logger::Warning, "Resource package: %d entries carry extra fields of other tools; read as single entries",
+        Logger::log(Logger::Warning,
+                    "Resource package: %d entries carry extra fields of other tools; read as single entries",
                     foreign);
     }
     return boost::shared_ptr<FileSystem>(new FileSystemImpl(zip->getIndex()));
@@ -69,7 +70,8 @@ boost::shared_ptr<InputStream> ResourceFile::openInputStream(const std::string& 
         return file->getInputStream(*entry, true);
     }
     if (!partsHold(*entry, extra.totalSize, extra.blockSize)) {
-        Logger::log(Logger::Error, "ResourceFile: %s claims %u bytes in blocks of %u that the package does not hold",
+        Logger::log(Logger::Error,
+                    "ResourceFile: %s claims %u bytes in blocks of %u that the package does not hold",
                     name.c_str(), extra.totalSize, extra.blockSize);
         return boost::shared_ptr<InputStream>();
     }
@@ -78,7 +80,8 @@ boost::shared_ptr<InputStream> ResourceFile::openInputStream(const std::string& 
         extra.totalSize, extra.blockSize, shared_from_this()));
 }
 
-bool ResourceFile::partsHold(const Zip::ZipEntry& first, unsigned int totalSize, unsigned int blockSize) const {
+bool ResourceFile::partsHold(const Zip::ZipEntry& first, unsigned int totalSize,
+                             unsigned int blockSize) const {
     // A block size of 0 cannot describe a split resource.
     KD_ASSERT(blockSize > 0);
     if (blockSize == 0) {

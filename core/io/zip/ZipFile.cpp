@@ -1,14 +1,16 @@
 #include "io/zip/ZipFile.h"
 
+#include <algorithm>
 #include <boost/make_shared.hpp>
 #include <climits>
+#include <cstring>
 #include <new>
 #include <vector>
 
 #include "io/BufferInputStream.h"
-#include "util/Logger.h"
 #include "io/zip/impl/StoredZipInputStream.h"
 #include "io/zip/impl/UncachedZipInputStream.h"
+#include "util/Logger.h"
 
 namespace IO {
 namespace Zip {
@@ -18,8 +20,11 @@ namespace {
 // Deflate's densest form carries about 1032 output bytes per input byte.
 const unsigned long long kMaxDeflateRatio = 1032;
 
-InputStream* asStream(voidpf stream) {
-    return static_cast<InputStream*>(stream);
+// minizip reads a directory record in many small pieces; they come from this much read ahead.
+const size_t kReadAhead = 16 * 1024;
+
+ZipFile* asZip(voidpf opaque) {
+    return static_cast<ZipFile*>(opaque);
 }
 
 }  // namespace
@@ -35,25 +40,50 @@ ZipFile::~ZipFile() {
 voidpf ZCALLBACK ZipFile::openFile(voidpf opaque, const void* filename, int) {
     // minizip needs a file name; the archive is always opened under this one.
     KD_ASSERT(kdStrcmp(static_cast<const char*>(filename), "res") == 0);
-    asStream(opaque)->seek(0, KD_SEEK_SET);
+    asZip(opaque)->position = 0;
     return opaque;
 }
 
-uLong ZCALLBACK ZipFile::readFile(voidpf, voidpf stream, void* buffer, uLong size) {
+uLong ZCALLBACK ZipFile::readFile(voidpf, voidpf zip, void* buffer, uLong size) {
+    return asZip(zip)->readArchive(static_cast<unsigned char*>(buffer), size);
+}
+
+uLong ZipFile::readArchive(unsigned char* buffer, uLong size) {
     // minizip asks past the end only on a damaged archive and handles a short read itself; the
-    // stream must not see it as a bad state (that would assert, or throw through C code).
-    long long left = asStream(stream)->available();
-    if (left <= 0) {
-        return 0;
+    // stream must not see it as a bad state (that would assert, or throw through C code). The
+    // stream is positioned before every read of it: entry windows share it and move it.
+    uLong done = 0;
+    while (done < size && position < archiveSize) {
+        const unsigned long long wanted = std::min<unsigned long long>(
+            size - done, static_cast<unsigned long long>(archiveSize - position));
+        if (position >= aheadStart && position < aheadStart + static_cast<long long>(ahead.size())) {
+            const size_t at = static_cast<size_t>(position - aheadStart);
+            const size_t count = static_cast<size_t>(std::min<unsigned long long>(wanted, ahead.size() - at));
+            std::memcpy(buffer + done, ahead.data() + at, count);
+            done += count;
+            position += count;
+            continue;
+        }
+        stream->seek(position, KD_SEEK_SET);
+        if (wanted >= kReadAhead) {
+            const int count =
+                stream->read(buffer + done, static_cast<int>(std::min<unsigned long long>(wanted, INT_MAX)));
+            if (count <= 0) {
+                break;
+            }
+            done += count;
+            position += count;
+            continue;
+        }
+        ahead.resize(static_cast<size_t>(std::min<long long>(kReadAhead, archiveSize - position)));
+        const int count = stream->read(ahead.data(), static_cast<int>(ahead.size()));
+        aheadStart = position;
+        ahead.resize(count > 0 ? count : 0);
+        if (ahead.empty()) {
+            break;
+        }
     }
-    if (static_cast<unsigned long long>(left) < size) {
-        size = static_cast<uLong>(left);
-    }
-    if (size > INT_MAX) {
-        size = INT_MAX;
-    }
-    int count = asStream(stream)->read(buffer, static_cast<int>(size));
-    return count > 0 ? static_cast<uLong>(count) : 0;
+    return done;
 }
 
 uLong ZCALLBACK ZipFile::writeFile(voidpf, voidpf, const void*, uLong) {
@@ -61,13 +91,29 @@ uLong ZCALLBACK ZipFile::writeFile(voidpf, voidpf, const void*, uLong) {
     return static_cast<uLong>(-1);
 }
 
-ZPOS64_T ZCALLBACK ZipFile::tellFile(voidpf, voidpf stream) {
-    return static_cast<ZPOS64_T>(asStream(stream)->tell());
+ZPOS64_T ZCALLBACK ZipFile::tellFile(voidpf, voidpf zip) {
+    return static_cast<ZPOS64_T>(asZip(zip)->position);
 }
 
-long ZCALLBACK ZipFile::seekFile(voidpf, voidpf stream, ZPOS64_T offset, int origin) {
-    // minizip numbers its origins as the platform does.
-    asStream(stream)->seek(static_cast<long long>(offset), static_cast<KDfileSeekOrigin>(origin));
+long ZCALLBACK ZipFile::seekFile(voidpf, voidpf zip, ZPOS64_T offset, int origin) {
+    ZipFile* self = asZip(zip);
+    long long target = static_cast<long long>(offset);
+    switch (origin) {
+        case ZLIB_FILEFUNC_SEEK_SET:
+            break;
+        case ZLIB_FILEFUNC_SEEK_CUR:
+            target += self->position;
+            break;
+        case ZLIB_FILEFUNC_SEEK_END:
+            target += self->archiveSize;
+            break;
+        default:
+            return -1;
+    }
+    if (target < 0) {
+        return -1;
+    }
+    self->position = target;
     return 0;
 }
 
@@ -112,7 +158,7 @@ bool ZipFile::open(boost::shared_ptr<InputStream> archive) {
     functions.zseek64_file = &ZipFile::seekFile;
     functions.zclose_file = &ZipFile::closeFile;
     functions.zerror_file = &ZipFile::testError;
-    functions.opaque = stream.get();
+    functions.opaque = this;
 
     file = unzOpen2_64("res", &functions);
     if (!file) {
@@ -129,6 +175,8 @@ bool ZipFile::buildIndex() {
         return false;
     }
     boost::shared_ptr<ZipEntryMap> entries = boost::make_shared<ZipEntryMap>();
+    // The count is a claim; a directory record takes at least 46 bytes of the archive.
+    entries->reserve(static_cast<size_t>(std::min<unsigned long long>(info.number_entry, archiveSize / 46)));
     for (ZPOS64_T i = 0; i < info.number_entry; ++i) {
         int result = i == 0 ? unzGoToFirstFile(file) : unzGoToNextFile(file);
         if (result != UNZ_OK) {
@@ -140,7 +188,8 @@ bool ZipFile::buildIndex() {
             KD_ASSERT(false);
             return false;
         }
-        (*entries)[entry.name] = entry;
+        const std::string name = entry.name;
+        (*entries)[name] = std::move(entry);
     }
     index = entries;
     return true;
@@ -152,10 +201,12 @@ bool ZipFile::readCurrentEntry(ZipEntry& entry) {
     unz_file_info64 info;
     char name[256];
     unsigned char extra[64];
-    if (unzGetCurrentFileInfo64(file, &info, name, sizeof(name), extra, sizeof(extra), nullptr, 0) != UNZ_OK) {
+    if (unzGetCurrentFileInfo64(file, &info, name, sizeof(name), extra, sizeof(extra), nullptr, 0) !=
+        UNZ_OK) {
         return false;
     }
-    if (info.size_filename < sizeof(name) && info.size_file_extra <= sizeof(extra) && info.size_file_comment == 0) {
+    if (info.size_filename < sizeof(name) && info.size_file_extra <= sizeof(extra) &&
+        info.size_file_comment == 0) {
         entry.name.assign(name, info.size_filename);
         entry.extra.assign(extra, extra + info.size_file_extra);
     } else if (!readCurrentTexts(entry, info)) {
@@ -224,7 +275,8 @@ bool ZipFile::openCurrent(const ZipEntry& entry, long long& dataOffset) {
     if (claimsFit(entry, dataOffset)) {
         return true;
     }
-    Logger::log(Logger::Error, "ZipFile: entry %s claims more data than the archive holds", entry.name.c_str());
+    Logger::log(Logger::Error, "ZipFile: entry %s claims more data than the archive holds",
+                entry.name.c_str());
     unzCloseCurrentFile(file);
     return false;
 }
@@ -242,7 +294,9 @@ bool ZipFile::claimsFit(const ZipEntry& entry, long long dataOffset) const {
 }
 
 boost::shared_ptr<InputStream> ZipFile::inflateWhole(const ZipEntry& entry) {
-    unsigned char* bytes = entry.uncompressedSize <= INT_MAX ? new (std::nothrow) unsigned char[entry.uncompressedSize] : nullptr;
+    unsigned char* bytes = entry.uncompressedSize <= INT_MAX
+                               ? new (std::nothrow) unsigned char[entry.uncompressedSize]
+                               : nullptr;
     int count = bytes ? unzReadCurrentFile(file, bytes, entry.uncompressedSize) : -1;
     // Closing checks the CRC. A short or damaged entry must not be handed out: the caller
     // would read uninitialised or corrupt bytes as the resource.

@@ -6,6 +6,7 @@
 #include <boost/noncopyable.hpp>
 #include <boost/shared_ptr.hpp>
 #include <string>
+#include <vector>
 
 #include "io/InputStream.h"
 #include "io/zip/ZipEntry.h"
@@ -55,6 +56,9 @@ private:
     // Reads the open current entry whole and closes it.
     boost::shared_ptr<InputStream> inflateWhole(const ZipEntry& entry);
 
+    // Serves minizip's reads from a window of the archive read ahead.
+    uLong readArchive(unsigned char* buffer, uLong size);
+
     static voidpf ZCALLBACK openFile(voidpf opaque, const void* filename, int mode);
     static uLong ZCALLBACK readFile(voidpf opaque, voidpf stream, void* buffer, uLong size);
     static uLong ZCALLBACK writeFile(voidpf opaque, voidpf stream, const void* buffer, uLong size);
@@ -67,6 +71,10 @@ private:
     int openStreams = 0;
     boost::shared_ptr<InputStream> stream;
     long long archiveSize = 0;
+    // minizip's position in the archive, and what was last read ahead from where.
+    long long position = 0;
+    std::vector<unsigned char> ahead;
+    long long aheadStart = 0;
     unzFile file = nullptr;
     zlib_filefunc64_def functions;
     boost::shared_ptr<const ZipEntryMap> index;
