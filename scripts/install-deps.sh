@@ -7,7 +7,7 @@ PACKAGES=(
   build-essential cmake ninja-build pkg-config ccache clang-format
   libboost-dev zlib1g-dev libminizip-dev libtinyxml-dev
   libprotobuf-dev protobuf-compiler
-  libpng-dev libjpeg-dev
+  libpng-dev libjpeg-dev libjpeg-turbo-progs
   libogg-dev libspeex-dev libvorbis-dev libopenal-dev
   libgles-dev libegl-dev libegl-mesa0 libgl1-mesa-dri
   libcurl4-openssl-dev libcpp-httplib-dev

@@ -25,6 +25,12 @@ ResourceManager::~ResourceManager() {
     // Also discards a pump event still queued for this manager.
     kdInstallCallback(nullptr, KD_EVENT_USER, this);
     for (Contents::const_iterator it = contents.begin(); it != contents.end(); ++it) {
+        // Links waiting for removal are still in contents. Their device objects
+        // would otherwise stay in the context with nobody left to free them.
+        const boost::shared_ptr<Resource>& resource = (*it)->getResource();
+        if (resource && resource->isCached()) {
+            resource->clear(device);
+        }
         if ((*it)->getDesc() != nullptr) {
             (*it)->getDesc()->detachFromManager();
         }

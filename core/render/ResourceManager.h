@@ -24,8 +24,10 @@ class ResourceLink;
 class ResourceManager {
 public:
     ResourceManager();
-    // Descriptors still registered or queued are detached: they forget this
-    // manager and may register with another one.
+    // Clears every cached resource through the device (which must still be
+    // alive, with its context current, if one is set). Descriptors still
+    // registered or queued are detached: they forget this manager and may
+    // register with another one.
     ~ResourceManager();
 
     void setDevice(API::GraphicsDevice* newDevice) { device = newDevice; }

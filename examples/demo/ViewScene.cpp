@@ -1,7 +1,9 @@
 // Views: a view resumed by the platform animates for a while under an
 // UpdateGenerator, drawing into the real GLES context and picking up three
-// optional render resources one per frame; then it goes idle and its redraw
-// timer stops, so a second of idleness costs no timer wake-ups.
+// optional render resources one per frame; through the graphics device it
+// draws a JPEG photo and, blended over it, a PNG marker from the resource
+// package; then it goes idle and its redraw timer stops, so a second of
+// idleness costs no timer wake-ups.
 
 #include <GLES/gl.h>
 #include <KD/kdext.h>
@@ -18,13 +20,21 @@
 
 #include "BaseApp.h"
 #include "BaseView.h"
+#include "DemoImages.h"
 #include "DemoScene.h"
+#include "io/FileManager.h"
+#include "math/Matrix.h"
 #include "redraw/UpdateGenerator.h"
 #include "redraw/ViewRedrawManager.h"
 #include "render/Resource.h"
 #include "render/ResourceDesc.h"
 #include "render/ResourceFactory.h"
 #include "render/ResourceManager.h"
+#include "render/Texture.h"
+#include "render/TextureResource.h"
+#include "render/api/GraphicsDevice.h"
+#include "render/api/UniformConstants.h"
+#include "render/api/VertexDeclaration.h"
 #include "util/Timer.h"
 
 namespace {
@@ -53,7 +63,7 @@ public:
     bool isReady() const { return ready; }
 
 protected:
-    // There is no graphics device yet; the band is drawn with plain clears.
+    // The band is drawn with plain clears; it needs nothing on the device.
     void doCache(Render::API::GraphicsDevice*) override { ready = true; }
     void doClear(Render::API::GraphicsDevice*) override { ready = false; }
 
@@ -89,6 +99,11 @@ public:
 
     void draw() override {
         ++frames;
+        if (!device) {
+            // The first frame is the first time the context is current.
+            device = Render::API::GraphicsDevice::create();
+            getResourceManager()->setDevice(device.get());
+        }
         getResourceManager()->process();
         float t = static_cast<float>(phaseMs) / 1000.0f;
         glClearColor(0.5f + 0.5f * std::sin(t * 3.0f), 0.5f + 0.5f * std::sin(t * 2.0f + 2.0f),
@@ -99,6 +114,7 @@ public:
                 drawBand(*bands[i]);
             }
         }
+        drawPictures();
     }
 
     void onViewEvent106() override {}
@@ -112,12 +128,63 @@ public:
     int phaseMs;
     int frames;
     bool animating;
+    // Outlives the resource manager, which BaseView ends at hideView.
+    boost::shared_ptr<Render::API::GraphicsDevice> device;
     std::vector<boost::shared_ptr<Render::ResourceDesc> > bands;
+    boost::shared_ptr<Render::Texture> photo;
+    boost::shared_ptr<Render::Texture> marker;
     // Set by the ready callbacks: a queued descriptor is drawn only once the
     // manager has announced it.
     bool bandReady[kBandCount] = {false, false, false};
 
 private:
+    // The photo opaque in the middle of the view, the marker blended over
+    // its lower edge; both at their size in pixels.
+    void drawPictures() {
+        Matrix ortho;
+        ortho.setOrtho(0, static_cast<float>(getWidth()), 0, static_cast<float>(getHeight()), -1, 1);
+        device->setViewport({0, 0, getWidth(), getHeight()});
+        device->setConstant(Render::API::UniformConstants::UNIFORM_MATRIX_WVP, ortho.m, 16);
+        const float white[] = {1, 1, 1, 1};
+        device->setConstant(Render::API::UniformConstants::UNIFORM_COLOR, white, 4);
+        const float x = getWidth() / 2.0f;
+        const float y = getHeight() / 2.0f;
+        device->setBlendState(Render::API::BlendState::OPAQUE);
+        drawPicture(photo, x - 64, y - 64, 2.0f);
+        device->setBlendState(Render::API::BlendState::ALPHA_BLEND);
+        drawPicture(marker, x - 50, y - 90, 1.0f);
+        device->setBlendState(Render::API::BlendState::OPAQUE);
+        device->setTexture(0, boost::shared_ptr<Render::API::Texture2D>());
+    }
+
+    void drawPicture(const boost::shared_ptr<Render::Texture>& texture, float x, float y, float scale) {
+        if (!texture) {
+            return;
+        }
+        boost::shared_ptr<Render::Resource> resource = texture->getResource(getResourceManager());
+        const Render::TextureResource* cached = static_cast<const Render::TextureResource*>(resource.get());
+        if (cached == nullptr || !cached->getTexture2D()) {
+            return;
+        }
+        // The image fills the lower-left part of its power-of-two texture.
+        const float w = texture->getWidth() * scale;
+        const float h = texture->getHeight() * scale;
+        const float s = static_cast<float>(texture->getWidth()) / cached->getTextureWidth();
+        const float t = static_cast<float>(texture->getHeight()) / cached->getTextureHeight();
+        // Image rows run top to bottom, so t grows downwards on the screen.
+        const float quad[] = {x, y, 0, t, x + w, y, s, t, x + w, y + h, s, 0, x, y + h, 0, 0};
+        Render::API::VertexDeclaration declaration;
+        declaration.stride = 4 * sizeof(float);
+        declaration.elements.push_back(
+            {Render::API::VertexDeclaration::USAGE_POSITION, Render::API::TYPE_FLOAT2, 0});
+        declaration.elements.push_back(
+            {Render::API::VertexDeclaration::USAGE_TEXCOORD, Render::API::TYPE_FLOAT2, 8});
+        device->setTexture(0, cached->getTexture2D());
+        device->setVertexBufferUP(quad, sizeof(quad));
+        device->setVertexDeclaration(declaration);
+        device->drawPrimitives(Render::API::PRIMITIVE_TRIANGLE_FAN, 0, 4);
+    }
+
     void drawBand(const Render::ResourceDesc& band) {
         boost::shared_ptr<Render::Resource> resource = band.getResource(getResourceManager());
         const BandResource* bandResource = static_cast<const BandResource*>(resource.get());
@@ -185,6 +252,7 @@ public:
         view->animating = true;
         generator.reset(new Redraw::UpdateGenerator(*view->getRedrawManager()));
         queueBands();
+        makePictures();
         demo::say("animating for %lld ms with an UpdateGenerator", kAnimationNs / kMillisecond);
         step.start(Util::Timer::OneShot, kAnimationNs);
     }
@@ -201,6 +269,25 @@ private:
             view->bands.push_back(band);
         }
         demo::say("queued %d optional resources; the view caches one per frame", kBandCount);
+    }
+
+    // Decoded now, on this thread; uploaded when first drawn.
+    void makePictures() {
+        const std::string package =
+            std::string("/res/") + kdGetStringZVR(KD_STRING_PACKAGE_NAME_ZVR) + ".pak";
+        if (!demo::packMarkerPng(package) || !demo::writePhotoJpeg("/data/photo.jpg")) {
+            demo::say("could not write the demo pictures");
+            return;
+        }
+        IO::FileManager::initResourceFileSystem();
+        view->marker = boost::make_shared<Render::Texture>(
+            Render::Texture::Accessor::createResourceFileAccessor(false, Image::PNG, "marker.png"), 1, 0, 0);
+        IO::FileManager::shutdownResourceFileSystem();
+        view->photo = boost::make_shared<Render::Texture>(
+            Render::Texture::Accessor::createRawFileAccessor(false, Image::JPEG, "/data/photo.jpg"), 1, 0, 0);
+        demo::say("decoded marker.png from %s (%ux%u) and /data/photo.jpg (%ux%u); uploaded when first drawn",
+                  package.c_str(), view->marker->getWidth(), view->marker->getHeight(),
+                  view->photo->getWidth(), view->photo->getHeight());
     }
 
     void nextStep() {
@@ -261,6 +348,9 @@ private:
             band->shutdownResource();
         }
         view->bands.clear();
+        // Their device textures are freed with the view's resource manager.
+        view->photo.reset();
+        view->marker.reset();
         BaseApp::get()->hideView(view.get());
         view.reset();
     }

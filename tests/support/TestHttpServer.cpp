@@ -140,6 +140,7 @@ void TestHttpServer::Impl::record(const httplib::Request& request) {
     Received entry;
     entry.method = request.method;
     entry.path = request.path;
+    entry.target = request.target;
     entry.body = request.body;
     for (const auto& header : request.headers) {
         entry.headers.insert(std::make_pair(header.first, header.second));

@@ -48,6 +48,8 @@ public:
     struct Received {
         std::string method;
         std::string path;
+        // Path and query as the client sent them.
+        std::string target;
         std::string body;
         std::multimap<std::string, std::string> headers;
         // Filled when the body was multipart/form-data.

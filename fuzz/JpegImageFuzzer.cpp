@@ -1,0 +1,13 @@
+// JPEG files through Image::createImage, with the stream-backed source that
+// supplies an end marker when the data runs out. A decoded image must be as
+// large as its layout says, readable to the last byte, and survive inversion
+// and cloning; anything else must be refused without a crash or a hang.
+#include <cstddef>
+#include <cstdint>
+
+#include "ImageFuzzing.h"
+
+extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
+    image_fuzz::exercise(data, size, Image::JPEG);
+    return 0;
+}

@@ -1,0 +1,294 @@
+// Decoding checked against images written by other encoders (Python's zlib
+// for PNG, cjpeg for JPEG; see data/make_images.py), and against input that
+// is damaged, truncated or too large.
+#include <pal/Simulation.h>
+
+#include <boost/make_shared.hpp>
+#include <cstdlib>
+#include <fstream>
+#include <iterator>
+#include <string>
+#include <vector>
+
+#include "image/Image.h"
+#include "io/ByteArrayInputStream.h"
+#include "io/FileManager.h"
+#include "io/FileOutputStream.h"
+#include "io/resource/PackageBuilder.h"
+#include "math/Color.h"
+#include "support/PalTest.h"
+
+namespace {
+
+typedef std::vector<unsigned char> Bytes;
+
+Bytes readData(const std::string& name) {
+    std::ifstream in(std::string(MAPCORE_IMAGE_DATA) + "/" + name, std::ios::binary);
+    return Bytes(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
+}
+
+boost::shared_ptr<Image> decode(const Bytes& bytes, Image::ImageFormat format) {
+    IO::ByteArrayInputStream in(bytes.data(), static_cast<int>(bytes.size()));
+    return Image::createImage(&in, format);
+}
+
+Bytes dataOf(const Image& image) {
+    return Bytes(image.getData(), image.getData() + image.getSize());
+}
+
+// The pixels of a binary PPM or PGM with a plain "P6\nW H\n255\n" header.
+Bytes netpbmPixels(const Bytes& file) {
+    int newlines = 0;
+    size_t i = 0;
+    while (i < file.size() && newlines < 3) {
+        newlines += file[i++] == '\n';
+    }
+    return Bytes(file.begin() + i, file.end());
+}
+
+class ImageTest : public PalTest {};
+
+struct PngCase {
+    const char* name;
+    unsigned bitsPerPixel;
+    bool palette;
+};
+
+class PngDecodingTest : public ImageTest, public ::testing::WithParamInterface<PngCase> {};
+
+TEST_P(PngDecodingTest, DecodesToTheBytesTheIndependentEncoderExpects) {
+    const PngCase& c = GetParam();
+    boost::shared_ptr<Image> image = decode(readData(std::string(c.name) + ".png"), Image::PNG);
+    ASSERT_TRUE(image);
+    EXPECT_EQ(image->getWidth(), 7u);
+    EXPECT_EQ(image->getHeight(), 5u);
+    EXPECT_EQ(image->getBitsPerPixel(), c.bitsPerPixel);
+    EXPECT_EQ(image->getStride(), 7 * c.bitsPerPixel / 8);
+    EXPECT_EQ(image->getPaletteSize(), c.palette ? 256u : 0u);
+    EXPECT_EQ(image->getPaletteBitsPerEntry(), c.palette ? 24u : 0u);
+    EXPECT_EQ(image->getSize(), (c.palette ? 768u : 0u) + 5 * image->getStride());
+    EXPECT_EQ(dataOf(*image), readData(std::string(c.name) + ".expected"));
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    EveryColourTypeAndDepth, PngDecodingTest,
+    ::testing::Values(PngCase{"gray1", 8, false}, PngCase{"gray2", 8, false}, PngCase{"gray4", 8, false},
+                      PngCase{"gray8", 8, false}, PngCase{"gray16", 8, false}, PngCase{"palette1", 8, true},
+                      PngCase{"palette2", 8, true}, PngCase{"palette4", 8, true},
+                      PngCase{"palette8", 8, true}, PngCase{"rgb8", 24, false}, PngCase{"rgb16", 24, false},
+                      PngCase{"grayalpha8", 32, false}, PngCase{"grayalpha16", 32, false},
+                      PngCase{"rgba8", 32, false}, PngCase{"rgba16", 32, false},
+                      PngCase{"rgb8-interlaced", 24, false}, PngCase{"palette2-interlaced", 8, true},
+                      PngCase{"gray16-interlaced", 8, false}, PngCase{"grayalpha8-interlaced", 32, false}),
+    [](const ::testing::TestParamInfo<PngCase>& info) {
+        std::string name = info.param.name;
+        return name.replace(name.find('-') == std::string::npos ? name.size() : name.find('-'), 1, "");
+    });
+
+struct JpegCase {
+    const char* name;
+    const char* source;
+    unsigned bitsPerPixel;
+    int tolerance;
+};
+
+class JpegDecodingTest : public ImageTest, public ::testing::WithParamInterface<JpegCase> {};
+
+TEST_P(JpegDecodingTest, DecodesCloseToThePixelsTheFileWasMadeFrom) {
+    const JpegCase& c = GetParam();
+    boost::shared_ptr<Image> image = decode(readData(c.name), Image::JPEG);
+    ASSERT_TRUE(image);
+    EXPECT_EQ(image->getWidth(), 24u);
+    EXPECT_EQ(image->getHeight(), 16u);
+    EXPECT_EQ(image->getBitsPerPixel(), c.bitsPerPixel);
+    EXPECT_EQ(image->getStride(), 24 * c.bitsPerPixel / 8);
+    EXPECT_EQ(image->getPaletteSize(), 0u);
+    Bytes expected = netpbmPixels(readData(c.source));
+    Bytes actual = dataOf(*image);
+    ASSERT_EQ(actual.size(), expected.size());
+    int worst = 0;
+    for (size_t i = 0; i < actual.size(); ++i) {
+        worst = std::max(worst, std::abs(actual[i] - expected[i]));
+    }
+    EXPECT_LE(worst, c.tolerance);
+    EXPECT_TRUE(logLines().empty());
+}
+
+INSTANTIATE_TEST_SUITE_P(CjpegOutput, JpegDecodingTest,
+                         ::testing::Values(JpegCase{"baseline.jpg", "gradient.ppm", 24, 6},
+                                           JpegCase{"progressive.jpg", "gradient.ppm", 24, 6},
+                                           JpegCase{"subsampled-restart.jpg", "gradient.ppm", 24, 12},
+                                           JpegCase{"gray.jpg", "gradient.pgm", 8, 4}));
+
+TEST_F(ImageTest, ATruncatedJpegStillDecodesWithAWarningButAnEmptyOneFails) {
+    // Cut halfway through the scan that follows the start-of-scan marker.
+    Bytes jpeg = readData("baseline.jpg");
+    size_t scan = 0;
+    while (scan + 1 < jpeg.size() && !(jpeg[scan] == 0xFF && jpeg[scan + 1] == 0xDA)) {
+        ++scan;
+    }
+    jpeg.resize((scan + jpeg.size()) / 2);
+    boost::shared_ptr<Image> image = decode(jpeg, Image::JPEG);
+    ASSERT_TRUE(image);
+    EXPECT_EQ(image->getWidth(), 24u);
+    EXPECT_EQ(image->getSize(), 24u * 16 * 3);
+    EXPECT_EQ(countLogLines("Premature end of JPEG file"), 1);
+
+    clearLog();
+    EXPECT_FALSE(decode(Bytes(), Image::JPEG));
+    EXPECT_EQ(countLogLines("Empty input file"), 1);
+    EXPECT_FALSE(decode(Bytes(), Image::PNG));
+}
+
+// Every prefix of a file, and the file with each byte in turn damaged, must
+// give an image or nothing, without an assertion or a crash.
+TEST_F(ImageTest, DamagedOrCutFilesGiveAnImageOrNothing) {
+    const char* names[] = {"rgb8-interlaced.png", "palette4.png", "progressive.jpg",
+                           "subsampled-restart.jpg"};
+    for (const char* name : names) {
+        const Image::ImageFormat format =
+            std::string(name).find(".png") != std::string::npos ? Image::PNG : Image::JPEG;
+        const Bytes file = readData(name);
+        const Bytes whole = dataOf(*decode(file, format));
+        for (size_t length = 0; length < file.size(); ++length) {
+            boost::shared_ptr<Image> image = decode(Bytes(file.begin(), file.begin() + length), format);
+            // A cut PNG decodes only when every row is there; a cut JPEG once its header is.
+            if (image && format == Image::PNG) {
+                EXPECT_EQ(dataOf(*image), whole) << name << " cut at " << length;
+            } else if (image) {
+                EXPECT_EQ(image->getSize(), whole.size()) << name << " cut at " << length;
+            }
+        }
+        for (size_t at = 0; at < file.size(); ++at) {
+            Bytes damaged = file;
+            damaged[at] ^= 0x5A;
+            boost::shared_ptr<Image> image = decode(damaged, format);
+            if (image) {
+                EXPECT_EQ(image->getSize(),
+                          image->getStride() * image->getHeight() + image->getPaletteSize() * 3)
+                    << name << " damaged at " << at;
+            }
+        }
+    }
+    EXPECT_TRUE(assertions().empty());
+}
+
+TEST_F(ImageTest, ImagesLargerThanTheLimitAreRefusedBeforeDecoding) {
+    // Width and height of the IHDR chunk, then its CRC made right again.
+    Bytes png = readData("rgb8.png");
+    png[16] = 0;
+    png[17] = 0;
+    png[18] = 0x20;
+    png[19] = 0x01;  // 8193 wide
+    unsigned long crc = crc32(0, png.data() + 12, 17);
+    for (int i = 0; i < 4; ++i) {
+        png[29 + i] = static_cast<unsigned char>(crc >> (24 - 8 * i));
+    }
+    EXPECT_FALSE(decode(png, Image::PNG));
+    EXPECT_EQ(countLogLines("PNG: 8193x5 is larger than 8192x8192"), 1);
+
+    // The height and width of the start-of-frame segment.
+    Bytes jpeg = readData("baseline.jpg");
+    for (size_t i = 0; i + 8 < jpeg.size(); ++i) {
+        if (jpeg[i] == 0xFF && jpeg[i + 1] == 0xC0) {
+            jpeg[i + 5] = 0x7F;
+            jpeg[i + 6] = 0xFF;
+            break;
+        }
+    }
+    EXPECT_FALSE(decode(jpeg, Image::JPEG));
+    EXPECT_EQ(countLogLines("JPEG: 24x32767 is larger than 8192x8192"), 1);
+}
+
+TEST_F(ImageTest, UnknownFormatsAndMissingSourcesGiveNothing) {
+    Bytes png = readData("rgb8.png");
+    IO::ByteArrayInputStream in(png.data(), static_cast<int>(png.size()));
+    EXPECT_FALSE(Image::createImage(&in, 2));
+    expectAssertion("false");
+    EXPECT_FALSE(Image::createImage(nullptr, Image::PNG));
+    EXPECT_FALSE(Image::createImageFromFile("/data/missing.png", Image::PNG));
+    // A JPEG is not a PNG, nor the other way round.
+    EXPECT_FALSE(decode(readData("baseline.jpg"), Image::PNG));
+    EXPECT_FALSE(decode(png, Image::JPEG));
+}
+
+TEST_F(ImageTest, FilesAndResourcesDecodeThroughTheFileManager) {
+    const Bytes png = readData("rgba8.png");
+    {
+        IO::FileOutputStream out;
+        ASSERT_TRUE(out.init("/data/picture.png"));
+        out.write(png.data(), static_cast<int>(png.size()));
+    }
+    boost::shared_ptr<Image> fromFile = Image::createImageFromFile("/data/picture.png", Image::PNG);
+    ASSERT_TRUE(fromFile);
+    EXPECT_EQ(dataOf(*fromFile), readData("rgba8.expected"));
+
+    pal::setDeviceString(KD_STRING_PACKAGE_NAME_ZVR, "app");
+    {
+        boost::shared_ptr<IO::FileOutputStream> out = boost::make_shared<IO::FileOutputStream>();
+        ASSERT_TRUE(out->init("/res/app.pak"));
+        IO::Resource::PackageBuilder builder(out, 64);
+        const Bytes jpeg = readData("gray.jpg");
+        builder.addResource("icons/gray.jpg", jpeg.data(), jpeg.size(), false);
+    }
+    IO::FileManager::initResourceFileSystem();
+    boost::shared_ptr<Image> fromResource = Image::createImageFromResource("icons/gray.jpg", Image::JPEG);
+    EXPECT_FALSE(Image::createImageFromResource("icons/none.jpg", Image::JPEG));
+    IO::FileManager::shutdownResourceFileSystem();
+    ASSERT_TRUE(fromResource);
+    EXPECT_EQ(fromResource->getBitsPerPixel(), 8u);
+}
+
+TEST_F(ImageTest, RawPixelsAreCopiedAndClonesAreDeep) {
+    Bytes pixels = {1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 99};
+    boost::shared_ptr<Image> image = Image::createImage(pixels, 2, 2, 24);
+    ASSERT_TRUE(image);
+    EXPECT_EQ(image->getStride(), 6u);
+    EXPECT_EQ(dataOf(*image), Bytes(pixels.begin(), pixels.begin() + 12));
+    pixels[0] = 50;
+    EXPECT_EQ(image->getData()[0], 1);
+
+    boost::shared_ptr<Image> copy = image->clone();
+    copy->getData()[0] = 77;
+    EXPECT_EQ(image->getData()[0], 1);
+    EXPECT_EQ(copy->getStride(), 6u);
+    EXPECT_EQ(copy->getSize(), 12u);
+
+    boost::shared_ptr<Image> empty = Image::createImage(Bytes(), 0, 3, 32);
+    ASSERT_TRUE(empty);
+    EXPECT_EQ(empty->clone()->getData(), nullptr);
+
+    // Fewer bytes than the size asks for, sizes beyond the limit, partial bytes.
+    EXPECT_FALSE(Image::createImage(Bytes(11), 2, 2, 24));
+    EXPECT_FALSE(Image::createImage(Bytes(4), 8193, 1, 8));
+    EXPECT_FALSE(Image::createImage(Bytes(4), 0xFFFFFFFFu, 0xFFFFFFFFu, 32));
+    EXPECT_FALSE(Image::createImage(Bytes(4), 2, 2, 4));
+}
+
+TEST_F(ImageTest, InverseChangesColoursOrPaletteEntriesAndKeepsAlphaAndGray) {
+    boost::shared_ptr<Image> rgba = Image::createImage({200, 30, 90, 17, 0, 0, 0, 255}, 2, 1, 32);
+    rgba->inverse();
+    const KDuint32 first = Math::Color(200, 30, 90, 255).inverseRGB();
+    const KDuint32 second = Math::Color(0, 0, 0, 255).inverseRGB();
+    EXPECT_EQ(
+        dataOf(*rgba),
+        (Bytes{static_cast<unsigned char>(first), static_cast<unsigned char>(first >> 8),
+               static_cast<unsigned char>(first >> 16), 17, static_cast<unsigned char>(second),
+               static_cast<unsigned char>(second >> 8), static_cast<unsigned char>(second >> 16), 255}));
+
+    boost::shared_ptr<Image> gray = Image::createImage({10, 20}, 2, 1, 8);
+    gray->inverse();
+    EXPECT_EQ(dataOf(*gray), (Bytes{10, 20}));
+
+    boost::shared_ptr<Image> paletted = decode(readData("palette4.png"), Image::PNG);
+    ASSERT_TRUE(paletted);
+    Bytes before = dataOf(*paletted);
+    paletted->inverse();
+    Bytes after = dataOf(*paletted);
+    const KDuint32 entry = Math::Color(before[0], before[1], before[2], 255).inverseRGB();
+    EXPECT_EQ(after[0], static_cast<unsigned char>(entry));
+    EXPECT_EQ(after[2], static_cast<unsigned char>(entry >> 16));
+    EXPECT_TRUE(std::equal(before.begin() + 768, before.end(), after.begin() + 768));
+}
+
+}  // namespace

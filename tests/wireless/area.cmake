@@ -1,0 +1,2 @@
+# GeographicLib is the independent reference for the accuracy bounds.
+target_link_libraries(${target} PRIVATE PkgConfig::GEOGRAPHICLIB)
