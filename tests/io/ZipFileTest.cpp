@@ -186,6 +186,19 @@ TEST_F(ZipFileTest, LongNamesAreIndexedWholeAndOpen) {
     EXPECT_EQ(binary, entryBytes(*zip, name + "x", true));
 }
 
+TEST_F(ZipFileTest, IndexingReadsOnlyTheDirectorySoADamagedLocalHeaderSpoilsOnlyItsEntry) {
+    Bytes bytes = textAndBinary();
+    const Bytes local = {0x50, 0x4b, 0x03, 0x04};
+    auto second = std::search(std::search(bytes.begin(), bytes.end(), local.begin(), local.end()) + 4,
+                              bytes.end(), local.begin(), local.end());
+    second[0] = 'X';
+    zip = open(bytes);
+    ASSERT_TRUE(zip);
+    EXPECT_EQ(text, entryBytes(*zip, "a.txt", true));
+    EXPECT_FALSE(entryStream(*zip, "b.bin", true));
+    expectAssertion("false");
+}
+
 TEST_F(ZipFileTest, SizesThatTheArchiveCannotHoldAreRefusedBeforeAnythingIsSizedFromThem) {
     // Patches the sizes of the entry at index in its local header and its directory record alike
     // (minizip itself refuses the two when they disagree).
