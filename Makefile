@@ -3,8 +3,13 @@
 BUILD_DIR ?= build
 CMAKE_ARGS ?=
 JOBS ?= $(shell nproc)
+# make fuzz: the libFuzzer targets (clang, ASan+UBSan) in their own folder, each run in turn for
+# FUZZ_SECONDS. New inputs go to FUZZ_DIR/work/<Name>, findings to FUZZ_DIR/findings/, so the
+# checked-in seed corpus only grows by hand.
+FUZZ_DIR ?= build-fuzz
+FUZZ_SECONDS ?= 60
 
-.PHONY: deps configure build test demo bench clean
+.PHONY: deps configure build test demo bench fuzz-build fuzz fuzz-replay clean
 
 deps:
 	@bash scripts/install-deps.sh
@@ -24,5 +29,23 @@ demo: build
 bench: build
 	@for b in $(BUILD_DIR)/bench/bench_*; do echo "== $$b"; $$b || exit 1; done
 
+fuzz-build: deps
+	@cmake -S . -B $(FUZZ_DIR) -G Ninja -DMAPCORE_FUZZ=ON >/dev/null
+	@cmake --build $(FUZZ_DIR) -j $(JOBS)
+
+fuzz: fuzz-build
+	@mkdir -p $(FUZZ_DIR)/findings; status=0; \
+	for f in $(FUZZ_DIR)/fuzz/fuzz_*; do \
+	  name=$${f##*/fuzz_}; echo "== fuzz_$$name for $(FUZZ_SECONDS) s"; \
+	  mkdir -p $(FUZZ_DIR)/work/$$name; \
+	  $$f -max_total_time=$(FUZZ_SECONDS) -print_final_stats=1 \
+	    -artifact_prefix=$(FUZZ_DIR)/findings/$$name- \
+	    $(FUZZ_DIR)/work/$$name fuzz/corpus/$$name || status=1; \
+	done; exit $$status
+
+# Each target once over its seed corpus, as CI does.
+fuzz-replay: fuzz-build
+	@ctest --test-dir $(FUZZ_DIR) --output-on-failure -j $(JOBS)
+
 clean:
-	@rm -rf $(BUILD_DIR)
+	@rm -rf $(BUILD_DIR) $(FUZZ_DIR)

@@ -112,7 +112,14 @@ TEST_F(HttpExchangeTest, BodyStreamedWhileTheRequestRunsArrivesComplete) {
     EXPECT_TRUE(server->received()[0].body == payload);
     EXPECT_TRUE(recorder.body == payload);
     EXPECT_EQ("application/octet-stream", server->received()[0].header("Content-Type"));
-    EXPECT_EQ("chunked", server->received()[0].header("Transfer-Encoding"));
+    // Whether libcurl frames the body in chunks or with its length depends on whether the writer
+    // closed it before the transfer began; either way the whole body must be announced right.
+    const std::string framing = server->received()[0].header("Transfer-Encoding");
+    if (framing.empty()) {
+        EXPECT_EQ(std::to_string(payload.size()), server->received()[0].header("Content-Length"));
+    } else {
+        EXPECT_EQ("chunked", framing);
+    }
 }
 
 TEST_F(HttpExchangeTest, ClosedBodyStreamIsSentWithItsLengthAndAgainByASecondConnection) {

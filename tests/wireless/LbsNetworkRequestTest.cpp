@@ -61,18 +61,19 @@ protected:
                 this));
     }
 
-    // Pumps, moving the virtual clock a second at a time so that retries come
-    // due, until condition holds or the generous real-time bound runs out.
-    // On the virtual clock kdWaitEvent returns only for an event, so the
-    // condition must follow from one (an answer, a finished connection).
+    // Pumps and moves the virtual clock a second at a time, so that retries
+    // come due, until condition holds or the generous real-time bound runs
+    // out. The network peer works in real time and a wait for an event would
+    // not end on the virtual clock, so it polls.
     bool runUntil(const std::function<bool()>& condition) {
         const auto end = std::chrono::steady_clock::now() + std::chrono::seconds(20);
         while (!condition()) {
             if (std::chrono::steady_clock::now() >= end) {
                 return false;
             }
-            kdWaitEvent(5 * kMs);
+            pump();
             advanceMs(1000);
+            std::this_thread::sleep_for(std::chrono::milliseconds(1));
         }
         return true;
     }
@@ -91,19 +92,6 @@ protected:
     std::string lastTarget() const {
         const std::vector<TestHttpServer::Received> received = server.received();
         return received.empty() ? std::string() : received.back().target;
-    }
-
-    // The server's side posts us nothing: poll it, pumping meanwhile.
-    bool serverReceived(size_t count) {
-        const auto end = std::chrono::steady_clock::now() + std::chrono::seconds(20);
-        while (server.requestCount() < count) {
-            if (std::chrono::steady_clock::now() >= end) {
-                return false;
-            }
-            pump();
-            std::this_thread::sleep_for(std::chrono::milliseconds(1));
-        }
-        return true;
     }
 
     void onResponse(const LbsNetworkRequest::Response& response) { responses.push_back(response); }
@@ -207,7 +195,7 @@ TEST_F(LbsNetworkRequestTest, ANewSubmitOrCancelSilencesTheRunningQuery) {
     stall.body = located("1", "1", "1");
     server.on(kPath, stall);
     submit();
-    ASSERT_TRUE(serverReceived(1));
+    ASSERT_TRUE(runUntil([this] { return server.requestCount() == 1; }));
 
     answer(located("2", "2", "2"));
     EXPECT_FLOAT_EQ(2.0f, submitAndWait().latitude);
@@ -218,7 +206,7 @@ TEST_F(LbsNetworkRequestTest, ANewSubmitOrCancelSilencesTheRunningQuery) {
     server.on(kPath, stall);
     responses.clear();
     submit();
-    ASSERT_TRUE(serverReceived(3));
+    ASSERT_TRUE(runUntil([this] { return server.requestCount() == 3; }));
     request->cancel();
     EXPECT_EQ(Network::NetworkManager::NetworkIdle, manager->getNetworkActivityStatus());
 

@@ -161,7 +161,7 @@ void kdAccelerationDismissDataZVR(KDAccelerationZVR *record);
  * view's handler from the requesting thread's event loop with the context
  * current; several requests before that call are served by one call. */
 #ifdef __cplusplus
-struct KDViewProxyZVR {};
+struct KDViewProxyZVR;
 #else
 typedef struct KDViewProxyZVR KDViewProxyZVR;
 #endif
@@ -180,4 +180,10 @@ void alDestroyCaptureSessionZVR(KDCaptureSessionZVR *session);
 
 #ifdef __cplusplus
 }
+#endif
+
+#ifdef __cplusplus
+/* Defined outside the C block: an empty struct has no size in C, and C++
+ * views derive from it. */
+struct KDViewProxyZVR {};
 #endif
