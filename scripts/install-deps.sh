@@ -13,6 +13,7 @@ PACKAGES=(
   libcurl4-openssl-dev libcpp-httplib-dev
   libgtest-dev libgmock-dev libbenchmark-dev
   libgeographiclib-dev
+  zip
   clang libclang-rt-14-dev
   locales
 )
