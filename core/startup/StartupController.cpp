@@ -1,6 +1,7 @@
 #include "startup/StartupController.h"
 
 #include <KD/kd.h>
+
 #include <boost/make_shared.hpp>
 
 #include "lifecycle/PauseResumeHandler.h"
@@ -15,7 +16,10 @@
 namespace Startup {
 
 StartupController::StartupController()
-    : needSecondStartup(true), secondStartupSent(false), clientStartupParams(11), startupParams(11),
+    : needSecondStartup(true),
+      secondStartupSent(false),
+      clientStartupParams(11),
+      startupParams(11),
       pendingCollectRequests(0) {
     // Made first so that it is torn down after the controller, whose holder
     // still cancels its request then.
@@ -75,8 +79,8 @@ void StartupController::startCycle() {
     KD_ASSERT(pendingCollectRequests > 0);
     for (const boost::shared_ptr<StartupListener>& listener : snapshot) {
         listener->collectStartupParams(
-            StartupListener::CollectCallback::make<StartupController, &StartupController::onStartupParamsCollected>(
-                this));
+            StartupListener::CollectCallback::make<StartupController,
+                                                   &StartupController::onStartupParamsCollected>(this));
     }
 }
 
@@ -93,7 +97,8 @@ void StartupController::onStartupParamsCollected(const StartupParams& params) {
         startupParams[param.first] = param.second;
     }
     requestHolder.submitInfRetries(boost::make_shared<StartupRequest>(
-        startupParams, StartupRequest::ReadyCallback::make<StartupController, &StartupController::onStartupReady>(this)));
+        startupParams,
+        StartupRequest::ReadyCallback::make<StartupController, &StartupController::onStartupReady>(this)));
 }
 
 void StartupController::onStartupReady(TiXmlDocument* document) {
@@ -108,7 +113,8 @@ void StartupController::onStartupReady(TiXmlDocument* document) {
         return;
     }
     if (StartupData::getInstance()->uuid.empty()) {
-        Logger::log(Logger::Warning, "StartupController: the startup answers carry no uuid; not asking again");
+        Logger::log(Logger::Warning,
+                    "StartupController: the startup answers carry no uuid; not asking again");
     }
     for (const boost::shared_ptr<StartupListener>& listener : liveListeners()) {
         listener->onStartupReady();
@@ -124,7 +130,8 @@ void StartupController::addListener(const boost::weak_ptr<StartupListener>& list
 }
 
 void StartupController::removeListener(const StartupListener* listener) {
-    for (std::vector<boost::weak_ptr<StartupListener> >::iterator it = listeners.begin(); it != listeners.end(); ++it) {
+    for (std::vector<boost::weak_ptr<StartupListener> >::iterator it = listeners.begin();
+         it != listeners.end(); ++it) {
         boost::shared_ptr<StartupListener> live = it->lock();
         if (live.get() == listener) {
             listeners.erase(it);

@@ -15,8 +15,8 @@ void StartupFeature::init() {
     StartupController::getInstance()->addListener(boost::weak_ptr<StartupListener>(self));
     Lifecycle::PauseResumeHandler* handler = Lifecycle::PauseResumeHandler::getInstance();
     if (handler != nullptr) {
-        handler->addListener(
-            boost::weak_ptr<Lifecycle::PauseResumeListener>(boost::shared_ptr<Lifecycle::PauseResumeListener>(self)));
+        handler->addListener(boost::weak_ptr<Lifecycle::PauseResumeListener>(
+            boost::shared_ptr<Lifecycle::PauseResumeListener>(self)));
     }
 }
 

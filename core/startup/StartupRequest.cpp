@@ -18,7 +18,8 @@ const int kTimeoutMs = 30000;
 
 }  // namespace
 
-StartupRequest::StartupRequest(StartupParams& newParams, ReadyCallback onReady) : parsed(false), onReady(onReady) {
+StartupRequest::StartupRequest(StartupParams& newParams, ReadyCallback onReady)
+    : parsed(false), onReady(onReady) {
     params.swap(newParams);
 }
 

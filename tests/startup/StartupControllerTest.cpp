@@ -9,11 +9,11 @@
 #include <thread>
 #include <vector>
 
+#include "TestFeature.h"
 #include "lifecycle/PauseResumeHandler.h"
 #include "startup/StartupController.h"
 #include "startup/StartupData.h"
 #include "startup/StartupListener.h"
-#include "TestFeature.h"
 #include "support/PalTest.h"
 #include "support/TestHttpServer.h"
 
@@ -55,7 +55,8 @@ protected:
         StartupData::getInstance()->setHost(StartupData::HOST_STARTUP, server.url("/"));
         pal::scriptWifiScan(pal::Answer::after(0), {{"001122aabbcc", "home", -61}});
         pal::scriptCellInfo(pal::Answer::after(0), {true, 12345, 678, "26201", "262"});
-        serve(answerWith("<uuid>u-1</uuid><query_hosts><host type=\"tiles\">http://tiles/</host></query_hosts>"));
+        serve(answerWith(
+            "<uuid>u-1</uuid><query_hosts><host type=\"tiles\">http://tiles/</host></query_hosts>"));
     }
 
     void TearDown() override {

@@ -24,8 +24,8 @@ const KDust kMs = 1000000ull;
 class StartupListenersTest : public PalTest {
 protected:
     Startup::StartupListener::CollectCallback collector() {
-        return Startup::StartupListener::CollectCallback::make<StartupListenersTest, &StartupListenersTest::onCollected>(
-            this);
+        return Startup::StartupListener::CollectCallback::make<StartupListenersTest,
+                                                               &StartupListenersTest::onCollected>(this);
     }
     void onCollected(const StartupParams& params) { collected.push_back(params); }
 
@@ -58,8 +58,11 @@ TEST_F(StartupListenersTest, DefaultParametersDescribeTheDevice) {
         KDint dpi;
         const char* appVersion;
         const char* scale;
-    } cases[] = {{"3.259", 240, "325", "1.5"}, {"0", 160, "0", "1.0"}, {"garbage", 120, "0", "0.8"},
-                 {"-2", 320, "0", "2.0"},     {"1e30", 160, "0", "1.0"}};
+    } cases[] = {{"3.259", 240, "325", "1.5"},
+                 {"0", 160, "0", "1.0"},
+                 {"garbage", 120, "0", "0.8"},
+                 {"-2", 320, "0", "2.0"},
+                 {"1e30", 160, "0", "1.0"}};
     for (const auto& c : cases) {
         pal::setDeviceString(KD_STRING_APP_VERSION_ZVR, c.version);
         pal::setDotsPerInch(c.dpi);
@@ -101,10 +104,11 @@ TEST_F(StartupListenersTest, LastLocationIsSentOnlyWhenItIsKnown) {
 
 TEST_F(StartupListenersTest, AnswerFillsIdentifierHostsDeviceIdAndVoice) {
     pal::setDeviceId("old", true);
-    parse("<startup><uuid>u-7</uuid><deviceid>dev-9</deviceid><query_hosts>"
-          "<host type=\"tiles\">http://tiles.example/</host><host type=\"cellid\">https://a.example</host>"
-          "<host type=\"cellid\">https://b.example</host></query_hosts>"
-          "<features><voice><asr>on</asr><logging></logging></voice></features></startup>");
+    parse(
+        "<startup><uuid>u-7</uuid><deviceid>dev-9</deviceid><query_hosts>"
+        "<host type=\"tiles\">http://tiles.example/</host><host type=\"cellid\">https://a.example</host>"
+        "<host type=\"cellid\">https://b.example</host></query_hosts>"
+        "<features><voice><asr>on</asr><logging></logging></voice></features></startup>");
     StartupData* data = StartupData::getInstance();
     EXPECT_EQ("u-7", data->uuid);
     EXPECT_EQ("dev-9", pal::deviceIdSetByLibrary());
@@ -124,7 +128,8 @@ TEST_F(StartupListenersTest, MalformedAnswersKeepWhatIsKnown) {
     const char* answers[] = {
         "<other><uuid>x</uuid></other>",
         "<startup><query_hosts><host type=\"tiles\">ftp://bad/</host></query_hosts></startup>",
-        "<startup><uuid/><query_hosts><host>http://no-type/</host><host type=\"tiles\"/></query_hosts></startup>",
+        "<startup><uuid/><query_hosts><host>http://no-type/</host><host "
+        "type=\"tiles\"/></query_hosts></startup>",
         "<startup><uuid>u-2</uuid></startup>",
         "<startup><uuid>u-3</uuid><query_hosts><host type=\"tiles\">javascript:alert(1)</host>"
         "<host type=\"search\">https://search/</host></query_hosts></startup>",
@@ -149,8 +154,9 @@ TEST_F(StartupListenersTest, CellParametersOrNoneWithoutACell) {
     advanceMs(10);
     pump();
     ASSERT_EQ(1u, collected.size());
-    EXPECT_EQ((StartupParams{{"operatorid", "26201"}, {"countrycode", "262"}, {"cellid", "12345"}, {"lac", "678"}}),
-              collected[0]);
+    EXPECT_EQ(
+        (StartupParams{{"operatorid", "26201"}, {"countrycode", "262"}, {"cellid", "12345"}, {"lac", "678"}}),
+        collected[0]);
 
     listener.cancelCollectStartupParams();
     pal::scriptCellInfo(pal::Answer::refuse(), {});
@@ -177,15 +183,16 @@ TEST_F(StartupListenersTest, CancelledCollectionNeverAnswers) {
 
 TEST_F(StartupListenersTest, WifiParameterJoinsAccessPointsAndLeavesOutBadBssids) {
     typedef boost::shared_ptr<Wireless::WifiScanResult> Result;
-    const std::vector<Result> two = {boost::make_shared<Wireless::WifiScanResult>("00:11:22:aa:bb:cc", "a", -61),
-                                     boost::make_shared<Wireless::WifiScanResult>("001122aabbcd", "b", -80)};
+    const std::vector<Result> two = {
+        boost::make_shared<Wireless::WifiScanResult>("00:11:22:aa:bb:cc", "a", -61),
+        boost::make_shared<Wireless::WifiScanResult>("001122aabbcd", "b", -80)};
     EXPECT_EQ("00:11:22:aa:bb:cc,-61;00:11:22:aa:bb:cd,-80", Startup::WifiStartupListener::encode(two));
     EXPECT_EQ("00:11:22:aa:bb:cc,-61", Startup::WifiStartupListener::encode({two[0]}));
 
-    const std::vector<Result> bad = {boost::make_shared<Wireless::WifiScanResult>("0011", "short", -1),
-                                     boost::make_shared<Wireless::WifiScanResult>("00112233445g", "nothex", -2),
-                                     boost::make_shared<Wireless::WifiScanResult>("0011223344556", "long", -3),
-                                     two[1]};
+    const std::vector<Result> bad = {
+        boost::make_shared<Wireless::WifiScanResult>("0011", "short", -1),
+        boost::make_shared<Wireless::WifiScanResult>("00112233445g", "nothex", -2),
+        boost::make_shared<Wireless::WifiScanResult>("0011223344556", "long", -3), two[1]};
     EXPECT_EQ("00:11:22:aa:bb:cd,-80", Startup::WifiStartupListener::encode(bad));
     EXPECT_EQ(3, countLogLines("is not 12 hexadecimal digits"));
 

@@ -33,7 +33,8 @@ std::string appVersion() {
     const double version = strtod(deviceString(KD_STRING_APP_VERSION_ZVR).c_str(), nullptr);
     const double hundredths = version * 100.0;
     // Out-of-range texts would make the conversion undefined; they say nothing anyway.
-    const unsigned int value = hundredths >= 0.0 && hundredths < 4294967296.0 ? static_cast<unsigned int>(hundredths) : 0;
+    const unsigned int value =
+        hundredths >= 0.0 && hundredths < 4294967296.0 ? static_cast<unsigned int>(hundredths) : 0;
     char buffer[16];
     snprintf(buffer, sizeof(buffer), "%u", value);
     return buffer;
@@ -59,7 +60,8 @@ void DefaultStartupListener::collectStartupParams(CollectCallback done) {
 void DefaultStartupListener::addDeviceParams(StartupParams& params) const {
     if (kdIsDeviceIdSupportedZVR() != 0) {
         KDchar buffer[kDeviceIdBufferSize] = {0};
-        params["deviceid"] = kdGetDeviceIdZVR(buffer, sizeof(buffer)) != 0 ? std::string(buffer) : std::string();
+        params["deviceid"] =
+            kdGetDeviceIdZVR(buffer, sizeof(buffer)) != 0 ? std::string(buffer) : std::string();
     }
     params["model"] = deviceString(KD_STRING_DEVICE_MODEL_ZVR);
     params["manufacturer"] = deviceString(KD_STRING_MANUFACTURER_ZVR);
@@ -100,7 +102,8 @@ void DefaultStartupListener::parseStartup(const TiXmlDocument& document) {
 void DefaultStartupListener::parseHosts(const TiXmlElement* root) {
     const TiXmlElement* queryHosts = root->FirstChildElement("query_hosts");
     if (queryHosts == nullptr) {
-        Logger::log(Logger::Warning, "DefaultStartupListener: the answer has no query_hosts; the known hosts stay");
+        Logger::log(Logger::Warning,
+                    "DefaultStartupListener: the answer has no query_hosts; the known hosts stay");
         return;
     }
     for (const TiXmlElement* host = queryHosts->FirstChildElement("host"); host != nullptr;
@@ -108,7 +111,9 @@ void DefaultStartupListener::parseHosts(const TiXmlElement* root) {
         const char* type = host->Attribute("type");
         const char* url = host->GetText();
         if (type == nullptr || url == nullptr || !isHttpUrl(url)) {
-            Logger::log(Logger::Warning, "DefaultStartupListener: host [%s] = [%s] skipped: a host needs a type and an http or https URL",
+            Logger::log(Logger::Warning,
+                        "DefaultStartupListener: host [%s] = [%s] skipped: a host needs a type and an http "
+                        "or https URL",
                         type != nullptr ? type : "", url != nullptr ? url : "");
             continue;
         }

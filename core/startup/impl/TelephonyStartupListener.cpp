@@ -1,8 +1,8 @@
 #include "startup/impl/TelephonyStartupListener.h"
 
 #include <KD/kd.h>
-#include <boost/make_shared.hpp>
 
+#include <boost/make_shared.hpp>
 #include <cstdio>
 
 #include "wireless/TelephonyNetworkInfo.h"

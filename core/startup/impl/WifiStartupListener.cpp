@@ -1,8 +1,8 @@
 #include "startup/impl/WifiStartupListener.h"
 
 #include <KD/kd.h>
-#include <boost/make_shared.hpp>
 
+#include <boost/make_shared.hpp>
 #include <cctype>
 #include <sstream>
 
@@ -51,8 +51,8 @@ void WifiStartupListener::collectStartupParams(CollectCallback newDone) {
     done = newDone;
     request = boost::make_shared<Wireless::WifiScanRequest>();
     request->start(
-        Wireless::WifiScanRequest::Callback::make<WifiStartupListener, &WifiStartupListener::onWifiScanCompleted>(
-            this));
+        Wireless::WifiScanRequest::Callback::make<WifiStartupListener,
+                                                  &WifiStartupListener::onWifiScanCompleted>(this));
 }
 
 void WifiStartupListener::cancelCollectStartupParams() {
@@ -72,12 +72,14 @@ void WifiStartupListener::onWifiScanCompleted(
     done(params);
 }
 
-std::string WifiStartupListener::encode(const std::vector<boost::shared_ptr<Wireless::WifiScanResult> >& results) {
+std::string WifiStartupListener::encode(
+    const std::vector<boost::shared_ptr<Wireless::WifiScanResult> >& results) {
     std::ostringstream out;
     bool first = true;
     for (const boost::shared_ptr<Wireless::WifiScanResult>& result : results) {
         if (!result || !isPlainBssid(result->getBssid())) {
-            Logger::log(Logger::Warning, "WifiStartupListener: BSSID [%s] is not 12 hexadecimal digits; left out",
+            Logger::log(Logger::Warning,
+                        "WifiStartupListener: BSSID [%s] is not 12 hexadecimal digits; left out",
                         result ? result->getBssid().c_str() : "");
             continue;
         }
