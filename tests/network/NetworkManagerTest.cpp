@@ -1,4 +1,6 @@
+#include <atomic>
 #include <mutex>
+#include <thread>
 
 #include "NetworkTest.h"
 
