@@ -1,48 +1,31 @@
 #pragma once
 
-#include <pal/Simulation.h>
-
 #include <boost/shared_ptr.hpp>
 #include <cstddef>
 #include <cstdint>
-#include <cstdio>
-#include <cstdlib>
 
+#include "FuzzSupport.h"
 #include "image/Image.h"
 #include "io/ByteArrayInputStream.h"
 
-// What the image fuzz targets share. Decoding needs no running platform
-// layer, only a quiet log and assertions that return (as in a release
-// build); a broken promise of the decoder stops the run as a finding.
+// What the image fuzz targets share: decode, then hold the decoder to its
+// promises about the layout of what it returns.
 namespace image_fuzz {
 
-inline void check(bool holds, const char* promise) {
-    if (!holds) {
-        std::fprintf(stderr, "image fuzz: broken promise: %s\n", promise);
-        std::abort();
-    }
-}
-
-inline bool quietPlatform() {
-    pal::setAssertionHandler([](const char*, const char*, int) {});
-    pal::setLogSink([](const char*) {});
-    return true;
-}
-
 inline void exercise(const uint8_t* data, size_t size, Image::ImageFormat format) {
-    static const bool quiet = quietPlatform();
-    (void)quiet;
+    fuzz::bootPlatform();
     IO::ByteArrayInputStream in(data, static_cast<int>(size));
     boost::shared_ptr<Image> image = Image::createImage(&in, format);
     if (!image) {
         return;
     }
-    check(image->getWidth() <= Image::kMaxSide && image->getHeight() <= Image::kMaxSide,
-          "size within the limit");
-    check(image->getStride() == image->getWidth() * image->getBitsPerPixel() / 8, "rows without padding");
-    check(image->getSize() == image->getPaletteSize() * image->getPaletteBitsPerEntry() / 8 +
-                                  image->getStride() * image->getHeight(),
-          "size matches the layout");
+    fuzz::check(image->getWidth() <= Image::kMaxSide && image->getHeight() <= Image::kMaxSide,
+                "size within the limit");
+    fuzz::check(image->getStride() == image->getWidth() * image->getBitsPerPixel() / 8,
+                "rows without padding");
+    fuzz::check(image->getSize() == image->getPaletteSize() * image->getPaletteBitsPerEntry() / 8 +
+                                        image->getStride() * image->getHeight(),
+                "size matches the layout");
     // Reading every byte lets the sanitizers see an array shorter than its size.
     unsigned sum = 0;
     for (unsigned i = 0; i < image->getSize(); ++i) {
@@ -50,7 +33,7 @@ inline void exercise(const uint8_t* data, size_t size, Image::ImageFormat format
     }
     image->inverse();
     boost::shared_ptr<Image> copy = image->clone();
-    check(copy->getSize() == image->getSize(), "a clone has the same size");
+    fuzz::check(copy->getSize() == image->getSize(), "a clone has the same size");
     (void)sum;
 }
 

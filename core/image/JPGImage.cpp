@@ -129,16 +129,14 @@ bool JPGImage::decode(j_decompress_ptr cinfo) {
     if (!prepareLayout(cinfo)) {
         return false;
     }
-    JSAMPARRAY row =
-        (*cinfo->mem->alloc_sarray)(reinterpret_cast<j_common_ptr>(cinfo), JPOOL_IMAGE, stride, 1);
-    // The output height is the height allocated for, so rows stay in data.
+    // Rows are decoded straight into place: the output height is the height
+    // allocated for, so they stay in data.
     unsigned char* out = data.get();
     while (cinfo->output_scanline < cinfo->output_height) {
-        if (jpeg_read_scanlines(cinfo, row, 1) != 1) {
+        JSAMPROW row = out + static_cast<size_t>(cinfo->output_scanline) * stride;
+        if (jpeg_read_scanlines(cinfo, &row, 1) != 1) {
             return false;
         }
-        std::memcpy(out, row[0], stride);
-        out += stride;
     }
     jpeg_finish_decompress(cinfo);
     return true;

@@ -31,8 +31,6 @@ public:
     void onTaskTimeout();
     void onNetworkReachabilityChanged(NetworkManager::NetworkReachabilityStatus status);
 
-    int getRetryCount() const { return retryCount; }
-
 private:
     NetworkTaskBasicRetryPolicy(const NetworkTaskBasicRetryPolicy&) = delete;
     NetworkTaskBasicRetryPolicy& operator=(const NetworkTaskBasicRetryPolicy&) = delete;

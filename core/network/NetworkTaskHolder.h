@@ -25,8 +25,6 @@ public:
     void onFinished();
     bool isWorking() const { return task.get() != nullptr; }
 
-    const boost::shared_ptr<NetworkTask>& getTask() const { return task; }
-
 private:
     NetworkTaskHolder(const NetworkTaskHolder&) = delete;
     NetworkTaskHolder& operator=(const NetworkTaskHolder&) = delete;

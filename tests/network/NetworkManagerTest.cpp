@@ -192,6 +192,15 @@ TEST_F(NetworkManagerTest, OverallTimeoutEndsTheTaskAndItsConnectionButNeverEndl
     holder.cancel();
     manager->cancel(unbounded);
 
+    // Held back by offline mode, a task times out just the same.
+    manager->changeOfflineModeStatus(NetworkManager::OfflineModeOn);
+    Task queued = makeTask(refusedUrl());
+    manager->submit(queued, policy(1000, 1, true));
+    advanceMs(31000);
+    EXPECT_EQ((std::vector<int>{Network::TASK_TIMEOUT_ERROR_CODE}), queued->finishCodes);
+    EXPECT_EQ(0, manager->getUnreadyCount());
+    manager->changeOfflineModeStatus(NetworkManager::OfflineModeOff);
+
     // A zero limit still allows its one attempt a full period.
     Task single = makeTask(serve("/single", 200, "done"));
     manager->submit(single, policy(1000, 0, true));
@@ -409,4 +418,39 @@ TEST_F(NetworkManagerTest, ReachabilityIsFollowedOnlyWhileSomeoneListensAndTheAp
     pump();
     EXPECT_EQ(2u, first.own.size());
     EXPECT_EQ(NetworkManager::NetworkReachableViaWifi, manager->getNetworkReachabilityStatus());
+
+    // A listener removed by an earlier one during a signal is not called.
+    struct Remover {
+        void onChange(NetworkManager::NetworkReachabilityStatus) {
+            NetworkManager::getInstance()->removeNetworkReachabilityStatusCallback(removed);
+        }
+        NetworkManager::NetworkReachabilityStatusCallback removed;
+    } remover{second.reachability()};
+    NetworkManager::NetworkReachabilityStatusCallback removing =
+        NetworkManager::NetworkReachabilityStatusCallback::make<Remover, &Remover::onChange>(&remover);
+    manager->addNetworkReachabilityStatusCallback(removing);
+    manager->addNetworkReachabilityStatusCallback(second.reachability());
+    pal::setReachability(2);
+    pump();
+    EXPECT_EQ(2u, second.own.size());
+    manager->removeNetworkReachabilityStatusCallback(removing);
+}
+
+TEST_F(NetworkManagerTest, ShutdownDropsTasksWhereverTheyAreWithoutCallbacks) {
+    Task running = makeTask(serve("/stall", 200, "", Reply::StallBeforeReply));
+    running->timeoutMs = 0;
+    manager->submit(running);
+    Task waitingForNetwork = makeTask(serve("/busy", 503));
+    waitingForNetwork->onResponse = [] { pal::setReachability(0); };
+    manager->submit(waitingForNetwork);
+    Task unready = makeTask(running->url);
+    unready->ready = false;
+    manager->submit(unready);
+    pumpUntil([&] { return pal::reachabilityListeners() == 1; });
+    shutdownPal();
+    server->releaseStalls();
+    EXPECT_EQ((std::vector<std::string>{"request"}), running->log);
+    EXPECT_EQ((std::vector<std::string>{"request", "response 503"}), waitingForNetwork->log);
+    EXPECT_TRUE(unready->log.empty());
+    EXPECT_EQ(0, pal::reachabilityListeners());
 }

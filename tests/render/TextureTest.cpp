@@ -34,10 +34,9 @@ Bytes pattern(unsigned width, unsigned height, unsigned channels) {
     return bytes;
 }
 
-boost::shared_ptr<Texture> rawTexture(const Bytes& pixels, unsigned width, unsigned height, unsigned bits,
-                                      Texture::Filter filter = 0, Texture::WrapMode wrap = 0) {
+boost::shared_ptr<Texture> rawTexture(const Bytes& pixels, unsigned width, unsigned height, unsigned bits) {
     return boost::make_shared<Texture>(
-        Texture::Accessor::createRawBytesAccessor(false, pixels, width, height, bits), filter, wrap, wrap);
+        Texture::Accessor::createRawBytesAccessor(false, pixels, width, height, bits), 0, 0, 0);
 }
 
 class TextureTest : public GlesTest {
@@ -172,33 +171,7 @@ TEST_F(TextureTest, PalettedImagesKeepTheirPaletteWhenTheyFitAndAreExpandedOther
     });
 }
 
-TEST_F(TextureTest, FilterAndWrapValuesMapToTheDeviceAndOtherDepthsAreRefused) {
-    struct Case {
-        Texture::Filter filter;
-        Texture::WrapMode wrap;
-        GLint minFilter;
-        GLint magFilter;
-        GLint glWrap;
-    } cases[] = {{0, 0, GL_NEAREST, GL_NEAREST, GL_CLAMP_TO_EDGE},
-                 {1, 1, GL_LINEAR, GL_LINEAR, GL_REPEAT},
-                 {2, 2, GL_LINEAR_MIPMAP_LINEAR, GL_LINEAR, GL_CLAMP_TO_EDGE},
-                 {7, -1, GL_NEAREST, GL_NEAREST, GL_CLAMP_TO_EDGE}};
-    for (const Case& c : cases) {
-        boost::shared_ptr<Texture> texture = rawTexture(pattern(4, 4, 4), 4, 4, 32, c.filter, c.wrap);
-        frame([&] {
-            glBindTexture(GL_TEXTURE_2D, nameOf(*cache(*texture)));
-            GLint value = 0;
-            glGetTexParameteriv(GL_TEXTURE_2D, GL_TEXTURE_MIN_FILTER, &value);
-            EXPECT_EQ(value, c.minFilter);
-            glGetTexParameteriv(GL_TEXTURE_2D, GL_TEXTURE_MAG_FILTER, &value);
-            EXPECT_EQ(value, c.magFilter);
-            glGetTexParameteriv(GL_TEXTURE_2D, GL_TEXTURE_WRAP_S, &value);
-            EXPECT_EQ(value, c.glWrap);
-            glGetTexParameteriv(GL_TEXTURE_2D, GL_TEXTURE_WRAP_T, &value);
-            EXPECT_EQ(value, c.glWrap);
-            glBindTexture(GL_TEXTURE_2D, 0);
-        });
-    }
+TEST_F(TextureTest, OtherDepthsAreRefusedAtUpload) {
     boost::shared_ptr<Texture> sixteenBits = rawTexture(pattern(2, 2, 2), 2, 2, 16);
     frame([&] { EXPECT_FALSE(cache(*sixteenBits)->getTexture2D()); });
     expectAssertion("unsupported bits per pixel");

@@ -65,12 +65,9 @@ public:
     void onFinished(boost::shared_ptr<HttpConnection> from, int code);
 
     const boost::shared_ptr<NetworkTask>& getTask() const { return task; }
-    const boost::shared_ptr<NetworkTaskRetryPolicy>& getRetryPolicy() const { return retryPolicy; }
     int getId() const { return id; }
-    bool isFinished() const { return finished; }
     bool isWithdrawn() const { return withdrawn; }
     bool isWaitingForRetry() const { return waitingForRetry; }
-    int getStatusCode() const { return statusCode; }
 
     // For tests of the id wrap.
     static void setNextObjectId(int value) { nextObjectId = value; }

@@ -86,15 +86,15 @@ GraphicsDeviceImpl::GraphicsDeviceImpl()
 }
 
 void GraphicsDeviceImpl::declareProgram(const char* name, ProgramCreator creator) {
-    if (creatorsCount >= kMaxPrograms) {
-        kdHandleAssertion("too many programs", __FILE__, __LINE__);
-        return;
-    }
     for (int i = 0; i < creatorsCount; ++i) {
         if (creatorNames[i] == name) {
             kdHandleAssertion("program declared twice", __FILE__, __LINE__);
             return;
         }
+    }
+    if (creatorsCount >= kMaxPrograms) {
+        kdHandleAssertion("too many programs", __FILE__, __LINE__);
+        return;
     }
     creatorNames[creatorsCount] = name;
     creators[creatorsCount] = creator;

@@ -1,0 +1,19 @@
+#pragma once
+
+#include <deque>
+
+#include "location/LocationFilter.h"
+
+namespace Location {
+
+// Replaces the position and altitude by their mean over the last 3 fixes.
+class LocationFilterAveragePosition : public LocationFilter {
+public:
+    Location filter(const Location& location) override;
+    void reset() override;
+
+private:
+    std::deque<Location> window;
+};
+
+}  // namespace Location

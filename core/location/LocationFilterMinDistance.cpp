@@ -1,0 +1,34 @@
+#include "location/LocationFilterMinDistance.h"
+
+#include "math/CoordConversion.h"
+
+namespace Location {
+
+LocationFilterMinDistance::LocationFilterMinDistance() : lastLatitude(0.0f), lastLongitude(0.0f) {}
+
+Location LocationFilterMinDistance::filter(const Location& location) {
+    if (lastLatitude == 0.0f || lastLongitude == 0.0f) {
+        lastLatitude = location.latitude;
+        lastLongitude = location.longitude;
+        return location;
+    }
+    const float distance =
+        CoordConversion::getDistance(lastLatitude, lastLongitude, location.latitude, location.longitude);
+    if (0.5f * location.accuracy < distance) {
+        lastLatitude = location.latitude;
+        lastLongitude = location.longitude;
+        return location;
+    }
+    Location held = location;
+    held.latitude = lastLatitude;
+    held.longitude = lastLongitude;
+    CoordConversion::toXY(held.latitude, held.longitude, held.x, held.y);
+    return held;
+}
+
+void LocationFilterMinDistance::reset() {
+    lastLatitude = 0.0f;
+    lastLongitude = 0.0f;
+}
+
+}  // namespace Location

@@ -1,0 +1,189 @@
+#include <gtest/gtest.h>
+
+#include "location/LocationFilterAverage.h"
+#include "location/LocationFilterAverageCourse.h"
+#include "location/LocationFilterGenerateCourse.h"
+#include "location/LocationFilterGenerateSpeed.h"
+#include "location/LocationFilterKalman.h"
+#include "location/LocationFilterMinDistance.h"
+#include "location/LocationTestSupport.h"
+#include "support/PalTest.h"
+
+namespace {
+
+using location_test::fixNear;
+using location_test::metresBetween;
+typedef Location::Location Fix;
+
+const float kLat = 52.52f;
+const float kLon = 13.405f;
+const KDust kSecond = 1000000000ull;
+
+// Deterministic jitter within +-5 m.
+float jitter(int i, int salt) {
+    return static_cast<float>((i * 37 + salt * 11) % 11) - 5.0f;
+}
+
+class LocationFilterTest : public PalTest {
+protected:
+    Fix fix(float north, float east, int second, float speed = -1.0f, float bearing = -1.0f,
+            float accuracy = 20.0f) {
+        return fixNear(kLat, kLon, north, east, accuracy, second * kSecond, speed, bearing);
+    }
+};
+
+TEST_F(LocationFilterTest, FirstFixPassesWithSpeedZeroAndNoCourseYet) {
+    Location::LocationFilterAverage chain;
+    const Fix first = fix(0, 0, 1);
+    const Fix out = chain.filter(first);
+    EXPECT_LT(metresBetween(first, out), 0.5f);
+    EXPECT_EQ(0.0f, out.speed);
+    EXPECT_EQ(-1.0f, out.bearing);
+    // Without a course the fix leaves the chain at network level.
+    EXPECT_EQ(Location::PrecisionNetwork, out.precision);
+}
+
+TEST_F(LocationFilterTest, StandingStillWithJitterKeepsTheFirstPosition) {
+    Location::LocationFilterMinDistance minDistance;
+    Location::LocationFilterAverage chain;
+    const Fix first = fix(0, 0, 1);
+    minDistance.filter(first);
+    chain.filter(first);
+    for (int i = 2; i < 40; ++i) {
+        const Fix noisy = fix(jitter(i, 1), jitter(i, 2), i);
+        const Fix held = minDistance.filter(noisy);
+        EXPECT_EQ(first.latitude, held.latitude) << i;
+        EXPECT_EQ(first.longitude, held.longitude) << i;
+        EXPECT_EQ(first.x, held.x) << i;
+        EXPECT_EQ(noisy.time, held.time) << i;
+        const Fix smoothed = chain.filter(noisy);
+        EXPECT_LT(metresBetween(first, smoothed), 0.5f) << i;
+        EXPECT_LT(smoothed.speed, 0.01f) << i;
+    }
+}
+
+TEST_F(LocationFilterTest, JumpOf83MetresOrMoreRestartsTheSmoothing) {
+    for (float jump : {80.0f, 100.0f}) {
+        Location::LocationFilterAverage chain;
+        for (int i = 0; i < 4; ++i) {
+            chain.filter(fix(12.0f * i, 0, i + 1, 12.0f, 0.0f, 10.0f));
+        }
+        const Fix far = fix(36.0f + jump, 0, 5, 12.0f, 0.0f, 10.0f);
+        const Fix out = chain.filter(far);
+        if (jump >= 83.0f) {
+            // Nothing of the old track is averaged in.
+            EXPECT_LT(metresBetween(far, out), 0.5f) << jump;
+        } else {
+            EXPECT_GT(metresBetween(far, out), 20.0f) << jump;
+        }
+    }
+}
+
+TEST_F(LocationFilterTest, CourseAverageIsCircular) {
+    Location::LocationFilterAverageCourse average;
+    Fix a = fix(0, 0, 1);
+    a.bearing = a.bearingXY = 350.0f;
+    Fix b = fix(0, 0, 2);
+    b.bearing = b.bearingXY = 10.0f;
+    average.filter(a);
+    const Fix out = average.filter(b);
+    EXPECT_GE(out.bearing, 0.0f);
+    EXPECT_LT(out.bearing, 360.0f);
+    EXPECT_LT(out.bearing < 180.0f ? out.bearing : 360.0f - out.bearing, 1e-3f);
+    EXPECT_EQ(out.bearing, out.bearingXY);
+}
+
+TEST_F(LocationFilterTest, SpeedStaysWhenTimeDoesNotMoveForward) {
+    Location::LocationFilterGenerateSpeed speed;
+    speed.filter(fix(0, 0, 10));
+    // 10 m in a second, as far as single-precision distances resolve it.
+    const float moving = speed.filter(fix(10, 0, 11)).speed;
+    EXPECT_NEAR(10.0f, moving, 2.0f);
+    // A window whose times all agree, then a fix from before the window.
+    for (int i = 0; i < 5; ++i) {
+        EXPECT_EQ(moving, speed.filter(fix(10, 0, 11)).speed) << i;
+    }
+    const Fix out = speed.filter(fix(500, 0, 3));
+    EXPECT_EQ(moving, out.speed);
+    EXPECT_GT(out.speedXY, 0);
+    // A fix that brings its own speed keeps it.
+    EXPECT_EQ(4.5f, speed.filter(fix(0, 0, 20, 4.5f)).speed);
+}
+
+TEST_F(LocationFilterTest, NetworkAndDroppedFixesDoNotTouchTheChain) {
+    Location::LocationFilterAverage chain;
+    const Fix network =
+        fixNear(kLat, kLon, 400, 0, 150.0f, kSecond, -1.0f, -1.0f, Location::PrecisionNetwork);
+    const Fix passed = chain.filter(network);
+    EXPECT_EQ(network.latitude, passed.latitude);
+    EXPECT_EQ(network.x, passed.x);
+    EXPECT_EQ(network.accuracy, passed.accuracy);
+    EXPECT_EQ(network.speed, passed.speed);
+    EXPECT_EQ(Location::PrecisionNetwork, passed.precision);
+
+    Fix noAccuracy = fix(0, 0, 2);
+    noAccuracy.accuracy = -1.0f;
+    Fix noPrecision = fix(0, 0, 2);
+    noPrecision.precision = Location::PrecisionNone;
+    for (const Fix& bad : {noAccuracy, noPrecision}) {
+        const Fix dropped = chain.filter(bad);
+        EXPECT_LT(dropped.accuracy, 0.0f);
+        EXPECT_EQ(Location::PrecisionNone, dropped.precision);
+    }
+    // The first satellite fix after them is still treated as the first.
+    EXPECT_EQ(0.0f, chain.filter(fix(0, 0, 3)).speed);
+}
+
+TEST_F(LocationFilterTest, FixBearingsAreKeptAndSmoothedWhileMoving) {
+    Location::LocationFilterAverage chain;
+    const float bearings[] = {90.0f, 90.0f, 100.0f, 110.0f, 120.0f};
+    for (int i = 0; i < 5; ++i) {
+        const Fix out = chain.filter(fix(0, 15.0f * i, i + 1, 15.0f, bearings[i], 8.0f));
+        EXPECT_EQ(Location::PrecisionSatellite, out.precision) << i;
+        const float expected = i < 2 ? 90.0f : (bearings[i - 2] + bearings[i - 1] + bearings[i]) / 3.0f;
+        EXPECT_NEAR(expected, out.bearing, 0.05f) << i;
+    }
+}
+
+TEST_F(LocationFilterTest, CourseWithoutFixBearingsComesFromTheTrack) {
+    struct Heading {
+        float north, east, course;
+    };
+    for (const Heading& heading :
+         {Heading{1, 0, 0}, Heading{0, 1, 90}, Heading{-1, 0, 180}, Heading{0, -1, 270}}) {
+        Location::LocationFilterGenerateCourse course;
+        Fix out;
+        for (int i = 0; i < 4; ++i) {
+            out = course.filter(fix(30.0f * i * heading.north, 30.0f * i * heading.east, i + 1, 1.0f));
+        }
+        EXPECT_NEAR(heading.course, out.bearing, 0.5f);
+        EXPECT_EQ(Location::PrecisionSatellite, out.precision);
+    }
+}
+
+TEST_F(LocationFilterTest, KalmanSmoothsRestartsAfterResetAndIgnoresInvalidFixes) {
+    Location::LocationFilterKalman kalman;
+    const Fix truth = fix(0, 0, 0);
+    float rawError = 0.0f;
+    float filteredError = 0.0f;
+    for (int i = 1; i <= 30; ++i) {
+        const Fix noisy = fix(jitter(i, 3) * 2.0f, jitter(i, 4) * 2.0f, i, -1.0f, -1.0f, 10.0f);
+        const Fix out = kalman.filter(noisy);
+        if (i > 10) {
+            rawError += metresBetween(truth, noisy);
+            filteredError += metresBetween(truth, out);
+        }
+    }
+    EXPECT_LT(filteredError, 0.6f * rawError);
+
+    Fix invalid = fix(900, 900, 31);
+    invalid.accuracy = -1.0f;
+    EXPECT_LT(kalman.filter(invalid).accuracy, 0.0f);
+    EXPECT_LT(metresBetween(truth, kalman.filter(fix(0, 0, 32, -1.0f, -1.0f, 10.0f))), 10.0f);
+
+    kalman.reset();
+    const Fix elsewhere = fix(5000, 5000, 33, -1.0f, -1.0f, 10.0f);
+    EXPECT_LT(metresBetween(elsewhere, kalman.filter(elsewhere)), 3.0f);
+}
+
+}  // namespace
