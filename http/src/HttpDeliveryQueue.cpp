@@ -1,5 +1,6 @@
 #include "HttpDeliveryQueue.h"
 
+#include "HttpTransfer.h"
 #include "network/HttpConnection.h"
 
 namespace Network {
@@ -10,12 +11,21 @@ namespace {
 // its connections, and no other code binds to this address.
 char deliveryEventToken;
 
+// Body bytes that may wait for a caller in parts mode; receiving resumes once
+// half of them have been taken. A megabyte keeps a fast link busy for the
+// time a busy caller thread takes to come back, without letting a slow one
+// pile up a whole download.
+const std::size_t kMaxBacklogBytes = 1024 * 1024;
+const std::size_t kResumeBacklogBytes = kMaxBacklogBytes / 2;
+
 }  // namespace
 
 HttpDeliveryQueue::HttpDeliveryQueue(const boost::weak_ptr<HttpConnection>& connection)
     : callerThread(kdThreadSelf()),
       connection(connection),
       mutex(kdThreadMutexCreate(nullptr)),
+      pendingBodyBytes(0),
+      readerWaiting(false),
       eventPosted(false),
       detached(false) {
     kdInstallCallback(&HttpDeliveryQueue::onEvent, KD_EVENT_USER, &deliveryEventToken);
@@ -41,10 +51,25 @@ void HttpDeliveryQueue::pushFinished(int code) {
     push(delivery);
 }
 
+void HttpDeliveryQueue::setBacklogReader(const boost::weak_ptr<HttpTransfer>& reader) {
+    kdThreadMutexLock(mutex);
+    backlogReader = reader;
+    kdThreadMutexUnlock(mutex);
+}
+
+bool HttpDeliveryQueue::hasRoomForBody() {
+    kdThreadMutexLock(mutex);
+    bool room = pendingBodyBytes < kMaxBacklogBytes;
+    readerWaiting = readerWaiting || !room;
+    kdThreadMutexUnlock(mutex);
+    return room;
+}
+
 void HttpDeliveryQueue::detach() {
     kdThreadMutexLock(mutex);
     detached = true;
     pending.clear();
+    pendingBodyBytes = 0;
     kdThreadMutexUnlock(mutex);
 }
 
@@ -59,13 +84,14 @@ void HttpDeliveryQueue::push(const Delivery& delivery) {
     kdThreadMutexLock(mutex);
     if (!detached) {
         pending.push_back(delivery);
+        pendingBodyBytes += delivery.chunk ? delivery.chunk->size() : 0;
     }
     kdThreadMutexUnlock(mutex);
 }
 
 void HttpDeliveryQueue::flush() {
     kdThreadMutexLock(mutex);
-    // One event drains everything queued until it is handled.
+    // One event delivers everything queued by the time it is handled.
     bool needEvent = !detached && !pending.empty() && !eventPosted;
     eventPosted = eventPosted || needEvent;
     kdThreadMutexUnlock(mutex);
@@ -91,19 +117,36 @@ void HttpDeliveryQueue::onEvent(const KDEvent* event) {
 bool HttpDeliveryQueue::takeNext(Delivery& delivery) {
     kdThreadMutexLock(mutex);
     if (detached || pending.empty()) {
-        eventPosted = false;
         kdThreadMutexUnlock(mutex);
         return false;
     }
     delivery = pending.front();
     pending.pop_front();
     kdThreadMutexUnlock(mutex);
+    if (delivery.chunk) {
+        noteBodyTaken(delivery.chunk->size());
+    }
     return true;
 }
 
+void HttpDeliveryQueue::noteBodyTaken(std::size_t size) {
+    kdThreadMutexLock(mutex);
+    pendingBodyBytes -= size < pendingBodyBytes ? size : pendingBodyBytes;
+    bool wake = readerWaiting && pendingBodyBytes <= kResumeBacklogBytes;
+    readerWaiting = readerWaiting && !wake;
+    boost::shared_ptr<HttpTransfer> reader = wake ? backlogReader.lock() : boost::shared_ptr<HttpTransfer>();
+    kdThreadMutexUnlock(mutex);
+    if (reader) {
+        reader->onBacklogDrained();
+    }
+}
+
 void HttpDeliveryQueue::deliverPending() {
+    kdThreadMutexLock(mutex);
+    std::size_t budget = pending.size();
+    kdThreadMutexUnlock(mutex);
     Delivery delivery;
-    while (takeNext(delivery)) {
+    for (; budget > 0 && takeNext(delivery); --budget) {
         // Held for the call: a callback may drop the owner's last reference.
         boost::shared_ptr<HttpConnection> target = connection.lock();
         if (!target) {
@@ -121,6 +164,12 @@ void HttpDeliveryQueue::deliverPending() {
                 break;
         }
     }
+    // What arrived meanwhile waits for an event of its own, so that a fast
+    // transfer cannot keep the caller thread from its other events.
+    kdThreadMutexLock(mutex);
+    eventPosted = false;
+    kdThreadMutexUnlock(mutex);
+    flush();
 }
 
 }  // namespace Network

@@ -13,6 +13,7 @@
 namespace Network {
 
 class HttpConnection;
+class HttpTransfer;
 
 // Carries one connection's results from the engine thread to its caller
 // thread. push, flush and detach may be called from any thread; construction
@@ -25,6 +26,11 @@ class HttpConnection;
 // Every wake-up event holds a reference to the queue, so an event queued
 // after a cancel or after the connection went away finds the queue alive and
 // detached, and delivers nothing.
+//
+// Body parts waiting for a slow caller are bounded: the engine asks
+// hasRoomForBody before it takes more from the socket, and hearing no, holds
+// the transfer until the caller has taken enough; the queue then tells the
+// transfer from the caller thread.
 class HttpDeliveryQueue : public boost::enable_shared_from_this<HttpDeliveryQueue> {
 public:
     struct Delivery {
@@ -43,6 +49,11 @@ public:
     void pushResponse(const boost::shared_ptr<HttpResponse>& response);
     void pushBodyData(const boost::shared_ptr<DataChunk>& chunk);
     void pushFinished(int code);
+    // The transfer to tell when body parts held back may come again.
+    void setBacklogReader(const boost::weak_ptr<HttpTransfer>& reader);
+    // False while the body parts not yet delivered exceed the bound; the
+    // reader is then told once they have drained.
+    bool hasRoomForBody();
     // Posts a wake-up event unless one is on its way or nothing is queued.
     void flush();
     // Nothing queued or pushed later is delivered any more.
@@ -60,11 +71,16 @@ private:
     // rest.
     bool takeNext(Delivery& delivery);
     void deliverPending();
+    // Caller thread: a body part of size bytes was taken off the queue.
+    void noteBodyTaken(std::size_t size);
 
     KDThread* callerThread;
     boost::weak_ptr<HttpConnection> connection;
     KDThreadMutex* mutex;
     std::deque<Delivery> pending;
+    std::size_t pendingBodyBytes;
+    bool readerWaiting;
+    boost::weak_ptr<HttpTransfer> backlogReader;
     bool eventPosted;
     bool detached;
 };

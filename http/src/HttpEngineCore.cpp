@@ -1,5 +1,11 @@
 #include "HttpEngineCore.h"
 
+#include <arpa/inet.h>
+#include <netinet/in.h>
+#include <poll.h>
+#include <sys/socket.h>
+#include <unistd.h>
+
 #include <algorithm>
 #include <boost/make_shared.hpp>
 
@@ -12,8 +18,6 @@ namespace {
 
 // Upper bound of one poll, so that a missed wake-up costs at most this.
 const long kLongestPollMs = 1000;
-// Easy handles kept for reuse; beyond this they are freed after their transfer.
-const std::size_t kSpareHandles = 32;
 
 struct Registry {
     KDThreadMutex* mutex = kdThreadMutexCreate(nullptr);
@@ -25,6 +29,16 @@ struct Registry {
 Registry& registry() {
     static Registry instance;
     return instance;
+}
+
+long portOf(const sockaddr_storage& address) {
+    if (address.ss_family == AF_INET) {
+        return ntohs(reinterpret_cast<const sockaddr_in&>(address).sin_port);
+    }
+    if (address.ss_family == AF_INET6) {
+        return ntohs(reinterpret_cast<const sockaddr_in6&>(address).sin6_port);
+    }
+    return -1;
 }
 
 }  // namespace
@@ -150,6 +164,7 @@ void HttpEngineCore::run() {
         if (!keepRunning) {
             break;
         }
+        noteWaitingBytes();
         int active = 0;
         curl_multi_perform(multi, &active);
         completeDoneTransfers();
@@ -158,10 +173,6 @@ void HttpEngineCore::run() {
         curl_multi_poll(multi, nullptr, 0, pollTimeoutMs(), nullptr);
     }
     failAll(HTTP_NO_ENGINE_ERROR_CODE);
-    for (CURL* handle : spareHandles) {
-        curl_easy_cleanup(handle);
-    }
-    spareHandles.clear();
 }
 
 bool HttpEngineCore::takeCommands(std::vector<Command>& taken) {
@@ -182,7 +193,7 @@ void HttpEngineCore::execute(const Command& command) {
             break;
         case Command::Resume:
             if (command.transfer->getHandle() != nullptr) {
-                command.transfer->resumeUpload();
+                command.transfer->resume();
             }
             break;
     }
@@ -193,24 +204,65 @@ void HttpEngineCore::startTransfer(const boost::shared_ptr<HttpTransfer>& transf
     if (transfer->isCancelled()) {
         return;
     }
-    CURL* handle = takeHandle();
+    // A fresh handle per transfer: libcurl keeps a handle's last OS error
+    // across transfers, and the failure codes tell the socket's errors from
+    // the answer's by it. Connections are kept by the multi handle, not here.
+    CURL* handle = curl_easy_init();
     if (handle == nullptr) {
         transfer->fail(HTTP_GENERIC_ERROR_CODE);
         transfer->flushDeliveries();
         return;
     }
+    // Sockets are made and closed here so that the engine knows which exist
+    // (see findSocket).
+    curl_easy_setopt(handle, CURLOPT_OPENSOCKETFUNCTION, &HttpEngineCore::openSocket);
+    curl_easy_setopt(handle, CURLOPT_OPENSOCKETDATA, this);
+    curl_easy_setopt(handle, CURLOPT_CLOSESOCKETFUNCTION, &HttpEngineCore::closeSocket);
+    curl_easy_setopt(handle, CURLOPT_CLOSESOCKETDATA, this);
     if (!transfer->open(handle)) {
         transfer->close();
-        returnHandle(handle);
+        curl_easy_cleanup(handle);
         return;
     }
     if (curl_multi_add_handle(multi, handle) != CURLM_OK) {
         transfer->fail(HTTP_GENERIC_ERROR_CODE);
         transfer->close();
-        returnHandle(handle);
+        curl_easy_cleanup(handle);
         return;
     }
     running[handle] = transfer;
+}
+
+curl_socket_t HttpEngineCore::openSocket(void* self, curlsocktype, curl_sockaddr* address) {
+    curl_socket_t socket = ::socket(address->family, address->socktype | SOCK_CLOEXEC, address->protocol);
+    if (socket != CURL_SOCKET_BAD) {
+        static_cast<HttpEngineCore*>(self)->sockets.push_back(socket);
+    }
+    return socket;
+}
+
+int HttpEngineCore::closeSocket(void* self, curl_socket_t socket) {
+    HttpEngineCore* core = static_cast<HttpEngineCore*>(self);
+    core->sockets.erase(std::remove(core->sockets.begin(), core->sockets.end(), socket), core->sockets.end());
+    for (const auto& entry : core->running) {
+        entry.second->forgetSocket(socket);
+    }
+    return ::close(socket);
+}
+
+curl_socket_t HttpEngineCore::findSocket(long localPort, long serverPort) const {
+    for (curl_socket_t socket : sockets) {
+        sockaddr_storage local;
+        sockaddr_storage peer;
+        socklen_t localLength = sizeof(local);
+        socklen_t peerLength = sizeof(peer);
+        if (::getsockname(socket, reinterpret_cast<sockaddr*>(&local), &localLength) == 0 &&
+            ::getpeername(socket, reinterpret_cast<sockaddr*>(&peer), &peerLength) == 0 &&
+            portOf(local) == localPort && portOf(peer) == serverPort) {
+            return socket;
+        }
+    }
+    return CURL_SOCKET_BAD;
 }
 
 void HttpEngineCore::cancelTransfer(const boost::shared_ptr<HttpTransfer>& transfer) {
@@ -237,6 +289,29 @@ void HttpEngineCore::completeDoneTransfers() {
         CURLcode result = message->data.result;
         transfer->complete(result);
         detach(transfer);
+    }
+}
+
+// Bytes of an answer's head that libcurl is about to read restart the
+// transfer's silence timeout, even before they make up a whole line.
+void HttpEngineCore::noteWaitingBytes() {
+    std::vector<pollfd> sockets;
+    std::vector<HttpTransfer*> owners;
+    for (const auto& entry : running) {
+        curl_socket_t socket = entry.second->isAwaitingAnswer() ? entry.second->getSocket() : CURL_SOCKET_BAD;
+        if (socket != CURL_SOCKET_BAD) {
+            pollfd waiting = {socket, POLLIN, 0};
+            sockets.push_back(waiting);
+            owners.push_back(entry.second.get());
+        }
+    }
+    if (sockets.empty() || ::poll(sockets.data(), sockets.size(), 0) <= 0) {
+        return;
+    }
+    for (std::size_t i = 0; i < sockets.size(); ++i) {
+        if (sockets[i].revents != 0) {
+            owners[i]->touch();
+        }
     }
 }
 
@@ -285,7 +360,7 @@ void HttpEngineCore::detach(const boost::shared_ptr<HttpTransfer>& transfer) {
     curl_multi_remove_handle(multi, handle);
     running.erase(handle);
     transfer->close();
-    returnHandle(handle);
+    curl_easy_cleanup(handle);
 }
 
 void HttpEngineCore::failAll(int code) {
@@ -297,24 +372,6 @@ void HttpEngineCore::failAll(int code) {
         transfer->fail(code);
         detach(transfer);
     }
-}
-
-CURL* HttpEngineCore::takeHandle() {
-    if (spareHandles.empty()) {
-        return curl_easy_init();
-    }
-    CURL* handle = spareHandles.back();
-    spareHandles.pop_back();
-    return handle;
-}
-
-void HttpEngineCore::returnHandle(CURL* handle) {
-    if (spareHandles.size() >= kSpareHandles) {
-        curl_easy_cleanup(handle);
-        return;
-    }
-    curl_easy_reset(handle);
-    spareHandles.push_back(handle);
 }
 
 }  // namespace Network

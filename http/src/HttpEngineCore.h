@@ -31,6 +31,11 @@ public:
     void remove(const boost::shared_ptr<HttpTransfer>& transfer);
     void resume(const boost::shared_ptr<HttpTransfer>& transfer);
 
+    // Engine thread: the open socket connected from localPort to
+    // serverPort, or CURL_SOCKET_BAD. libcurl names a transfer's connection
+    // only by its addresses, also when it reuses one.
+    curl_socket_t findSocket(long localPort, long serverPort) const;
+
 private:
     struct Command {
         enum Kind { Add, Remove, Resume };
@@ -47,20 +52,21 @@ private:
     bool queue(const Command& command);
 
     static void* threadMain(void* self);
+    static curl_socket_t openSocket(void* self, curlsocktype purpose, curl_sockaddr* address);
+    static int closeSocket(void* self, curl_socket_t socket);
     void run();
     // Takes the queued commands; false once the engine is to stop.
     bool takeCommands(std::vector<Command>& taken);
     void execute(const Command& command);
     void startTransfer(const boost::shared_ptr<HttpTransfer>& transfer);
     void cancelTransfer(const boost::shared_ptr<HttpTransfer>& transfer);
+    void noteWaitingBytes();
     void completeDoneTransfers();
     void expireSilentTransfers();
     void flushRunningTransfers();
     int pollTimeoutMs();
     void detach(const boost::shared_ptr<HttpTransfer>& transfer);
     void failAll(int code);
-    CURL* takeHandle();
-    void returnHandle(CURL* handle);
 
     KDThreadMutex* mutex;
     std::vector<Command> commands;
@@ -68,9 +74,9 @@ private:
     CURLM* multi;
     KDThread* thread;
 
-    // Engine thread only.
+    // Engine thread only, and the destructor's cleanup of the multi handle.
     boost::unordered_map<CURL*, boost::shared_ptr<HttpTransfer> > running;
-    std::vector<CURL*> spareHandles;
+    std::vector<curl_socket_t> sockets;
 };
 
 }  // namespace Network

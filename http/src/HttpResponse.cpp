@@ -2,9 +2,33 @@
 
 #include <strings.h>
 
-#include <cstdlib>
+#include <limits>
 
 namespace Network {
+
+namespace {
+
+const long long kLargestLength = std::numeric_limits<long long>::max();
+
+// Plain decimal digits that fit: no sign, no exponent, no overflow.
+long long parseLength(const std::string& text) {
+    std::size_t first = text.find_first_not_of(" \t");
+    std::size_t last = text.find_last_not_of(" \t");
+    if (first == std::string::npos) {
+        return -1;
+    }
+    long long value = 0;
+    for (std::size_t i = first; i <= last; ++i) {
+        char c = text[i];
+        if (c < '0' || c > '9' || value > (kLargestLength - (c - '0')) / 10) {
+            return -1;
+        }
+        value = value * 10 + (c - '0');
+    }
+    return value;
+}
+
+}  // namespace
 
 HttpResponse::HttpResponse(int statusCode, const std::string& reasonPhrase, const Headers& headers)
     : statusCode(statusCode), reasonPhrase(reasonPhrase), headers(headers) {}
@@ -19,15 +43,26 @@ std::string HttpResponse::getHeader(const std::string& name) const {
 }
 
 long long HttpResponse::getContentLength() const {
-    const Headers::value_type* header = findHeader("Content-Length");
-    if (header == nullptr || header->second.empty()) {
-        return -1;
-    }
-    const char* text = header->second.c_str();
-    char* end = nullptr;
-    long long length = std::strtoll(text, &end, 10);
-    if (*end != '\0' || length < 0 || text[0] == '-' || text[0] == '+') {
-        return -1;
+    long long length = -1;
+    for (const Headers::value_type& header : headers) {
+        if (strcasecmp(header.first.c_str(), "Content-Length") != 0) {
+            continue;
+        }
+        // Repeated fields and lists ("42, 42") are tolerated when they agree;
+        // anything else leaves the body's end unknown.
+        std::size_t start = 0;
+        for (;;) {
+            std::size_t comma = header.second.find(',', start);
+            long long value = parseLength(header.second.substr(start, comma - start));
+            if (value < 0 || (length >= 0 && value != length)) {
+                return -1;
+            }
+            length = value;
+            if (comma == std::string::npos) {
+                break;
+            }
+            start = comma + 1;
+        }
     }
     return length;
 }

@@ -3,7 +3,9 @@
 #include <KD/kdext.h>
 #include <strings.h>
 
+#include <algorithm>
 #include <boost/make_shared.hpp>
+#include <cctype>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
@@ -17,6 +19,8 @@ namespace Network {
 namespace {
 
 const long kMaxRedirects = 10;
+// The last chunk of a chunked body without trailers: "0\r\n\r\n".
+const curl_off_t kLastChunkSize = 5;
 
 bool isTokenCharacter(char c) {
     return (c >= 'A' && c <= 'Z') || (c >= 'a' && c <= 'z') || (c >= '0' && c <= '9') ||
@@ -36,17 +40,20 @@ bool isValidMethod(const std::string& method) {
     return true;
 }
 
-std::string trimmed(const std::string& text) {
-    std::size_t first = text.find_first_not_of(" \t");
-    if (first == std::string::npos) {
-        return std::string();
-    }
-    std::size_t last = text.find_last_not_of(" \t");
-    return text.substr(first, last - first + 1);
+bool isRedirect(int statusCode) {
+    return statusCode >= 300 && statusCode < 400;
 }
 
+// A 304 answers a conditional request; it sends nobody anywhere.
 bool isFollowedRedirect(int statusCode) {
-    return statusCode >= 300 && statusCode < 400 && statusCode != 304;
+    return isRedirect(statusCode) && statusCode != 304;
+}
+
+bool containsNoCase(const std::string& text, const std::string& word) {
+    return std::search(text.begin(), text.end(), word.begin(), word.end(), [](char a, char b) {
+               return std::tolower(static_cast<unsigned char>(a)) ==
+                      std::tolower(static_cast<unsigned char>(b));
+           }) != text.end();
 }
 
 int codeUnlessOffline(int code) {
@@ -76,6 +83,9 @@ int classify(CURLcode result, bool reachedServer) {
         case CURLE_HTTP2_STREAM:
         case CURLE_HTTP3:
         case CURLE_FILESIZE_EXCEEDED:
+#if LIBCURL_VERSION_NUM >= 0x080600
+        case CURLE_TOO_LARGE:
+#endif
             return HTTP_BAD_RESPONSE_ERROR_CODE;
         case CURLE_UNSUPPORTED_PROTOCOL:
             // Said of our URL, or of an answer that is not HTTP/1.x or later
@@ -116,9 +126,21 @@ HttpTransfer::HttpTransfer(const boost::shared_ptr<HttpRequest>& request, int id
       headerList(nullptr),
       uploadOffset(0),
       uploadPaused(false),
-      statusCode(0),
+      receivePaused(false),
+      socket(CURL_SOCKET_BAD),
+      headersOut(false),
+      bodyBytesOut(0),
+      bytesOutAfterBodyEnd(0),
+      bodySize(-1),
+      hasBody(false),
+      bodyEnded(false),
+      errnoAtConnect(0),
+      connected(false),
       skippingBlock(false),
       responseDelivered(false),
+      chunkedResponse(false),
+      stoppedAfterAnswer(false),
+      badAnswer(false),
       sentReported(false),
       finished(false),
       deliveriesQueued(false) {
@@ -134,6 +156,7 @@ bool HttpTransfer::begin(const boost::shared_ptr<HttpEngineCore>& engine) {
     if (bodyStream) {
         bodyStream->addReader(shared_from_this());
     }
+    deliveries->setBacklogReader(shared_from_this());
     return engine->add(shared_from_this());
 }
 
@@ -150,6 +173,10 @@ void HttpTransfer::onBodyAvailable() {
     if (engine) {
         engine->resume(shared_from_this());
     }
+}
+
+void HttpTransfer::onBacklogDrained() {
+    onBodyAvailable();
 }
 
 bool HttpTransfer::open(CURL* curl) {
@@ -178,6 +205,12 @@ bool HttpTransfer::open(CURL* curl) {
     curl_easy_setopt(handle, CURLOPT_WRITEDATA, this);
     curl_easy_setopt(handle, CURLOPT_PREREQFUNCTION, &HttpTransfer::onConnected);
     curl_easy_setopt(handle, CURLOPT_PREREQDATA, this);
+    // The debug hook is libcurl's word on what has been written to the
+    // socket: it tells when the request has left. Verbose only routes
+    // libcurl's reports to it; nothing is printed.
+    curl_easy_setopt(handle, CURLOPT_DEBUGFUNCTION, &HttpTransfer::onDebug);
+    curl_easy_setopt(handle, CURLOPT_DEBUGDATA, this);
+    curl_easy_setopt(handle, CURLOPT_VERBOSE, 1L);
     setMethodAndBody();
     setHeaders();
     return true;
@@ -185,7 +218,7 @@ bool HttpTransfer::open(CURL* curl) {
 
 void HttpTransfer::setMethodAndBody() {
     const std::string& method = request->getMethod();
-    bool hasBody = request->hasFixedBody() || bodyStream;
+    hasBody = request->hasFixedBody() || bodyStream;
     if (!hasBody) {
         if (method == "GET") {
             curl_easy_setopt(handle, CURLOPT_HTTPGET, 1L);
@@ -213,8 +246,8 @@ void HttpTransfer::setMethodAndBody() {
     }
     bool sizeKnown = request->hasFixedBody() || bodyStream->getClosedSize(size);
     // An unknown size makes libcurl send the body chunked.
-    curl_easy_setopt(handle, CURLOPT_POSTFIELDSIZE_LARGE,
-                     sizeKnown ? static_cast<curl_off_t>(size) : static_cast<curl_off_t>(-1));
+    bodySize = sizeKnown ? static_cast<curl_off_t>(size) : static_cast<curl_off_t>(-1);
+    curl_easy_setopt(handle, CURLOPT_POSTFIELDSIZE_LARGE, bodySize);
     if (method != "POST") {
         curl_easy_setopt(handle, CURLOPT_CUSTOMREQUEST, method.c_str());
     }
@@ -235,10 +268,23 @@ void HttpTransfer::setHeaders() {
     curl_easy_setopt(handle, CURLOPT_HTTPHEADER, headerList);
 }
 
-void HttpTransfer::resumeUpload() {
-    if (uploadPaused) {
-        uploadPaused = false;
-        curl_easy_pause(handle, CURLPAUSE_CONT);
+void HttpTransfer::resume() {
+    if (!uploadPaused && !receivePaused) {
+        return;
+    }
+    // Time spent waiting for our own side is not the server's silence.
+    if (receivePaused) {
+        touch();
+    }
+    uploadPaused = false;
+    receivePaused = false;
+    // May call the read and write callbacks at once, which pause again.
+    curl_easy_pause(handle, CURLPAUSE_CONT);
+}
+
+void HttpTransfer::forgetSocket(curl_socket_t closed) {
+    if (socket == closed) {
+        socket = CURL_SOCKET_BAD;
     }
 }
 
@@ -248,7 +294,7 @@ bool HttpTransfer::isExpired(Clock::time_point now) const {
 }
 
 bool HttpTransfer::getDeadline(Clock::time_point& deadline) const {
-    if (request->getTimeoutMs() <= 0) {
+    if (request->getTimeoutMs() <= 0 || receivePaused) {
         return false;
     }
     deadline = lastActivity + std::chrono::milliseconds(request->getTimeoutMs());
@@ -256,17 +302,50 @@ bool HttpTransfer::getDeadline(Clock::time_point& deadline) const {
 }
 
 void HttpTransfer::complete(CURLcode result) {
+    if (stoppedAfterAnswer) {
+        finish(HTTP_FINISHED_OK);
+        return;
+    }
+    if (badAnswer) {
+        kdLogFormatMessage("HttpConnection %d: the answer's length cannot be trusted", id);
+        finish(HTTP_BAD_RESPONSE_ERROR_CODE);
+        return;
+    }
     if (result == CURLE_OK) {
+        // libcurl takes a close inside the head for the end of a bodiless
+        // answer; without its blank line the head is cut short.
+        if (!responseDelivered && !skippingBlock) {
+            kdLogFormatMessage("HttpConnection %d: the answer ended inside its head", id);
+            finish(HTTP_BAD_RESPONSE_ERROR_CODE);
+            return;
+        }
         finish(HTTP_FINISHED_OK);
         return;
     }
     char* serverAddress = nullptr;
     curl_easy_getinfo(handle, CURLINFO_PRIMARY_IP, &serverAddress);
     bool reachedServer = serverAddress != nullptr && serverAddress[0] != '\0';
-    int code = codeUnlessOffline(classify(result, reachedServer));
+    int code = isFramingFault(result) ? HTTP_BAD_RESPONSE_ERROR_CODE : classify(result, reachedServer);
+    code = codeUnlessOffline(code);
     kdLogFormatMessage("HttpConnection %d: failed with %d: %s", id, code,
                        errorText[0] != '\0' ? errorText : curl_easy_strerror(result));
     finish(code);
+}
+
+// libcurl reports a bad chunk and a head beyond its size limits with the
+// codes it also uses for trouble on the socket. Only the socket's trouble
+// leaves an OS error behind.
+bool HttpTransfer::isFramingFault(CURLcode result) const {
+    bool inHead = connected && !responseDelivered;
+    if (result == CURLE_OUT_OF_MEMORY) {
+        return inHead;
+    }
+    if (result != CURLE_RECV_ERROR) {
+        return false;
+    }
+    long osError = 0;
+    curl_easy_getinfo(handle, CURLINFO_OS_ERRNO, &osError);
+    return osError == errnoAtConnect && (inHead || chunkedResponse);
 }
 
 void HttpTransfer::fail(int code) {
@@ -301,106 +380,149 @@ void HttpTransfer::close() {
     curl_slist_free_all(headerList);
     headerList = nullptr;
     handle = nullptr;
+    socket = CURL_SOCKET_BAD;
 }
 
 // The request is about to leave on an open connection: the server's time to
 // answer starts now, not when connecting started.
-int HttpTransfer::onConnected(void* self, char*, char*, int, int) {
-    static_cast<HttpTransfer*>(self)->touch();
+int HttpTransfer::onConnected(void* self, char*, char*, int serverPort, int localPort) {
+    HttpTransfer* transfer = static_cast<HttpTransfer*>(self);
+    transfer->touch();
+    transfer->connected = true;
+    boost::shared_ptr<HttpEngineCore> engine = transfer->core.lock();
+    transfer->socket = engine ? engine->findSocket(localPort, serverPort) : CURL_SOCKET_BAD;
+    curl_easy_getinfo(transfer->handle, CURLINFO_OS_ERRNO, &transfer->errnoAtConnect);
     return CURL_PREREQFUNC_OK;
+}
+
+int HttpTransfer::onDebug(CURL*, curl_infotype type, char*, size_t size, void* self) {
+    if (type == CURLINFO_HEADER_OUT || type == CURLINFO_DATA_OUT) {
+        static_cast<HttpTransfer*>(self)->noteOutgoing(type, size);
+    }
+    return 0;
+}
+
+void HttpTransfer::noteOutgoing(curl_infotype type, size_t size) {
+    requestSize.fetch_add(static_cast<long long>(size));
+    if (type == CURLINFO_HEADER_OUT) {
+        headersOut = true;
+    } else {
+        bodyBytesOut += static_cast<curl_off_t>(size);
+        if (bodyEnded) {
+            bytesOutAfterBodyEnd += static_cast<curl_off_t>(size);
+        }
+    }
+    if (hasRequestLeft()) {
+        reportSent();
+    }
+}
+
+// libcurl refills its send buffer only once it is empty, so when the body's
+// end has been handed over, all before it has left and only the last chunk
+// remains.
+bool HttpTransfer::hasRequestLeft() const {
+    if (!headersOut) {
+        return false;
+    }
+    if (!hasBody) {
+        return true;
+    }
+    if (bodySize >= 0) {
+        return bodyBytesOut >= bodySize;
+    }
+    return bodyEnded && bytesOutAfterBodyEnd >= kLastChunkSize;
 }
 
 size_t HttpTransfer::onHeaderLine(char* data, size_t size, size_t count, void* self) {
     HttpTransfer* transfer = static_cast<HttpTransfer*>(self);
     size_t length = size * count;
     transfer->touch();
-    transfer->reportSent();
     // Lines after the response was handed over are trailers: not kept.
     if (transfer->responseDelivered) {
         return length;
     }
-    std::string line(data, length);
-    while (!line.empty() && (line.back() == '\n' || line.back() == '\r')) {
-        line.pop_back();
-    }
-    if (line.empty()) {
-        transfer->headerBlockEnded();
-    } else {
-        transfer->headerLine(line);
+    switch (transfer->head.addLine(data, length)) {
+        case HttpResponseHead::StatusLine:
+            transfer->skippingBlock = false;
+            break;
+        case HttpResponseHead::EndOfHead:
+            return transfer->headEnded() ? length : 0;
+        case HttpResponseHead::Field:
+            break;
     }
     return length;
 }
 
-void HttpTransfer::headerLine(const std::string& line) {
-    if (line.compare(0, 5, "HTTP/") == 0) {
-        // A new status line starts a new answer (after a redirect or an
-        // interim 1xx).
-        std::size_t codeStart = line.find(' ');
-        statusCode = codeStart != std::string::npos ? std::atoi(line.c_str() + codeStart + 1) : 0;
-        std::size_t reasonStart =
-            codeStart != std::string::npos ? line.find(' ', codeStart + 1) : std::string::npos;
-        reasonPhrase =
-            reasonStart != std::string::npos ? trimmed(line.substr(reasonStart + 1)) : std::string();
-        responseHeaders.clear();
-        skippingBlock = false;
-        return;
+bool HttpTransfer::headEnded() {
+    int statusCode = head.getStatusCode();
+    if (statusCode >= 100 && statusCode < 200) {
+        skippingBlock = true;
+        return true;
     }
-    if ((line[0] == ' ' || line[0] == '\t') && !responseHeaders.empty()) {
-        responseHeaders.back().second += " " + trimmed(line);
-        return;
+    HttpResponse answer = head.toResponse();
+    if (answer.hasHeader("Content-Length") && answer.getContentLength() < 0) {
+        badAnswer = true;
+        return false;
     }
-    std::size_t colon = line.find(':');
-    if (colon == std::string::npos) {
-        return;
+    bool hasLocation = !answer.getHeader("Location").empty();
+    bool following = request->getFollowRedirects() && isRedirect(statusCode) && hasLocation;
+    skippingBlock = following && isFollowedRedirect(statusCode);
+    if (skippingBlock) {
+        return true;
     }
-    responseHeaders.push_back(
-        std::make_pair(trimmed(line.substr(0, colon)), trimmed(line.substr(colon + 1))));
-}
-
-void HttpTransfer::headerBlockEnded() {
-    bool interim = statusCode >= 100 && statusCode < 200;
-    bool redirected = request->getFollowRedirects() && isFollowedRedirect(statusCode) &&
-                      !HttpResponse(statusCode, reasonPhrase, responseHeaders).getHeader("Location").empty();
-    skippingBlock = interim || redirected;
-    if (!skippingBlock) {
-        deliverResponse();
-    }
+    chunkedResponse = containsNoCase(answer.getHeader("Transfer-Encoding"), "chunked");
+    // The server has the request should its leaving have gone unseen (a
+    // server that answers before reading the whole body).
+    reportSent();
+    deliverResponse();
+    // libcurl would follow the Location of a final answer too (a 304): this
+    // answer is complete and stays the only one.
+    stoppedAfterAnswer = following;
+    return !stoppedAfterAnswer;
 }
 
 void HttpTransfer::deliverResponse() {
     responseDelivered = true;
-    deliveries->pushResponse(boost::make_shared<HttpResponse>(statusCode, reasonPhrase, responseHeaders));
+    deliveries->pushResponse(boost::make_shared<HttpResponse>(head.toResponse()));
     deliveriesQueued = true;
 }
 
 size_t HttpTransfer::onBodyBytes(char* data, size_t size, size_t count, void* self) {
-    HttpTransfer* transfer = static_cast<HttpTransfer*>(self);
-    size_t length = size * count;
-    transfer->touch();
-    if (transfer->skippingBlock) {
+    return static_cast<HttpTransfer*>(self)->receiveBody(data, size * count);
+}
+
+size_t HttpTransfer::receiveBody(char* data, size_t length) {
+    touch();
+    if (skippingBlock) {
         return length;
     }
-    if (!transfer->responseDelivered) {
-        transfer->deliverResponse();
+    if (!responseDelivered) {
+        deliverResponse();
+    }
+    // A caller slow to take the parts holds the transfer: libcurl keeps these
+    // bytes and stops reading until resume().
+    if (!wholeBody && !deliveries->hasRoomForBody()) {
+        receivePaused = true;
+        return CURL_WRITEFUNC_PAUSE;
     }
     const unsigned char* bytes = reinterpret_cast<const unsigned char*>(data);
-    boost::shared_ptr<NetworkSpeedCollector> target = transfer->collector();
+    boost::shared_ptr<NetworkSpeedCollector> target = collector();
     boost::shared_ptr<DataChunk> chunk;
-    if (!transfer->wholeBody || target) {
+    if (!wholeBody || target) {
         chunk = boost::make_shared<DataChunk>(bytes, length);
     }
     if (target) {
-        target->onDataChunkReceived(transfer->id, chunk.get());
+        target->onDataChunkReceived(id, chunk.get());
     }
-    if (!transfer->wholeBody) {
-        transfer->deliveries->pushBodyData(chunk);
-        transfer->deliveriesQueued = true;
+    if (!wholeBody) {
+        deliveries->pushBodyData(chunk);
+        deliveriesQueued = true;
         return length;
     }
-    if (!transfer->wholeBodyData) {
-        transfer->wholeBodyData = boost::make_shared<DataChunk>();
+    if (!wholeBodyData) {
+        wholeBodyData = boost::make_shared<DataChunk>();
     }
-    transfer->wholeBodyData->insert(transfer->wholeBodyData->end(), bytes, bytes + length);
+    wholeBodyData->insert(wholeBodyData->end(), bytes, bytes + length);
     return length;
 }
 
@@ -419,8 +541,12 @@ size_t HttpTransfer::onUploadRead(char* buffer, size_t size, size_t count, void*
     bool ended = false;
     size_t copied = transfer->bodyStream->read(transfer->uploadOffset, buffer, capacity, ended);
     transfer->uploadOffset += copied;
-    if (copied > 0 || ended) {
+    if (copied > 0) {
         return copied;
+    }
+    if (ended) {
+        transfer->bodyEnded = true;
+        return 0;
     }
     // The writer is behind; the stream wakes us through resumeUpload.
     transfer->uploadPaused = true;
@@ -433,6 +559,13 @@ int HttpTransfer::onUploadSeek(void* self, curl_off_t offset, int origin) {
         return CURL_SEEKFUNC_CANTSEEK;
     }
     transfer->uploadOffset = static_cast<size_t>(offset);
+    // A resend from the start, on a fresh connection: it leaves anew.
+    if (offset == 0) {
+        transfer->headersOut = false;
+        transfer->bodyBytesOut = 0;
+        transfer->bytesOutAfterBodyEnd = 0;
+        transfer->bodyEnded = false;
+    }
     return CURL_SEEKFUNC_OK;
 }
 
@@ -441,7 +574,6 @@ void HttpTransfer::reportSent() {
         return;
     }
     sentReported = true;
-    updateRequestSize();
     boost::shared_ptr<NetworkSpeedCollector> target = collector();
     boost::shared_ptr<HttpConnection> owner = connection.lock();
     if (target && owner) {
@@ -449,23 +581,11 @@ void HttpTransfer::reportSent() {
     }
 }
 
-void HttpTransfer::updateRequestSize() {
-    if (handle == nullptr) {
-        return;
-    }
-    long headerBytes = 0;
-    curl_off_t bodyBytes = 0;
-    curl_easy_getinfo(handle, CURLINFO_REQUEST_SIZE, &headerBytes);
-    curl_easy_getinfo(handle, CURLINFO_SIZE_UPLOAD_T, &bodyBytes);
-    requestSize.store(static_cast<long long>(headerBytes) + static_cast<long long>(bodyBytes));
-}
-
 void HttpTransfer::finish(int code) {
     if (finished) {
         return;
     }
     finished = true;
-    updateRequestSize();
     if (code == HTTP_FINISHED_OK) {
         if (!responseDelivered) {
             deliverResponse();

@@ -10,6 +10,7 @@
 #include <string>
 
 #include "HttpDeliveryQueue.h"
+#include "HttpResponseHead.h"
 #include "network/HttpRequest.h"
 #include "network/HttpResponse.h"
 #include "network/NetworkSpeedCollector.h"
@@ -22,8 +23,8 @@ class HttpEngineCore;
 // The engine-side half of one connection: a libcurl easy handle's options,
 // callbacks and outcome. Made on the caller thread by HttpConnection::start;
 // from then on open, the curl callbacks and the finishing calls run on the
-// engine thread only. cancel, onBodyAvailable and getRequestSize may be
-// called from any thread.
+// engine thread only. cancel, onBodyAvailable, onBacklogDrained and
+// getRequestSize may be called from any thread.
 class HttpTransfer : public boost::enable_shared_from_this<HttpTransfer> {
 public:
     typedef std::chrono::steady_clock Clock;
@@ -43,13 +44,26 @@ public:
     bool isCancelled() const { return deliveries->isDetached(); }
     // Any thread: the body stream has new bytes or ended.
     void onBodyAvailable();
+    // Any thread: the caller has taken enough of the body parts waiting for
+    // it that receiving may go on.
+    void onBacklogDrained();
     long long getRequestSize() const { return requestSize.load(); }
 
     // Engine thread. Sets the handle up for this request; false (after
     // finishing with a failure code) when the request cannot be made.
     bool open(CURL* handle);
     CURL* getHandle() const { return handle; }
-    void resumeUpload();
+    // Lifts the pauses of sending and receiving; each pauses again at once
+    // if its reason remains.
+    void resume();
+    // Until the head of the answer is complete, bytes waiting on the socket
+    // count as activity: libcurl hands lines over only when they are whole.
+    bool isAwaitingAnswer() const { return !responseDelivered; }
+    // The socket the transfer reads from, or CURL_SOCKET_BAD.
+    curl_socket_t getSocket() const { return socket; }
+    // The engine closed this socket.
+    void forgetSocket(curl_socket_t closed);
+    void touch() { lastActivity = Clock::now(); }
     // Whether the transfer has been silent for longer than its timeout, and
     // when it will have been.
     bool isExpired(Clock::time_point now) const;
@@ -63,8 +77,8 @@ public:
     void abandon();
     // Wakes the caller thread for what this round of work queued.
     void flushDeliveries();
-    // Releases the handle's resources and flushes; the handle goes back to
-    // the engine.
+    // Releases what the handle used and flushes; the engine then frees the
+    // handle.
     void close();
 
 private:
@@ -73,6 +87,7 @@ private:
 
     static int onConnected(void* self, char* serverAddress, char* localAddress, int serverPort,
                            int localPort);
+    static int onDebug(CURL* handle, curl_infotype type, char* data, size_t size, void* self);
     static size_t onHeaderLine(char* data, size_t size, size_t count, void* self);
     static size_t onBodyBytes(char* data, size_t size, size_t count, void* self);
     static size_t onUploadRead(char* buffer, size_t size, size_t count, void* self);
@@ -80,12 +95,14 @@ private:
 
     void setMethodAndBody();
     void setHeaders();
-    void touch() { lastActivity = Clock::now(); }
-    void headerLine(const std::string& line);
-    void headerBlockEnded();
+    void noteOutgoing(curl_infotype type, size_t size);
+    bool hasRequestLeft() const;
+    // False when the transfer must stop at this head.
+    bool headEnded();
     void deliverResponse();
+    size_t receiveBody(char* data, size_t length);
     void reportSent();
-    void updateRequestSize();
+    bool isFramingFault(CURLcode result) const;
     void finish(int code);
     boost::shared_ptr<NetworkSpeedCollector> collector() const { return speedCollector.lock(); }
 
@@ -99,6 +116,8 @@ private:
     const boost::shared_ptr<HttpRequest::HttpBodyStream> bodyStream;
     boost::weak_ptr<HttpEngineCore> core;
 
+    // Every byte written to the socket for this request, redirects and
+    // resends included.
     std::atomic<long long> requestSize;
 
     // Engine thread only.
@@ -107,14 +126,34 @@ private:
     char errorText[CURL_ERROR_SIZE];
     std::size_t uploadOffset;
     bool uploadPaused;
+    // The caller has more body parts waiting than it may (parts mode).
+    bool receivePaused;
     Clock::time_point lastActivity;
-    int statusCode;
-    std::string reasonPhrase;
-    HttpResponse::Headers responseHeaders;
-    // The current header block belongs to a redirect being followed or to an
+    curl_socket_t socket;
+    // What has left so far, as libcurl reports it: whether the request's
+    // head went out, body bytes (with chunk framing) sent, and those sent
+    // after the body's end was handed over.
+    bool headersOut;
+    curl_off_t bodyBytesOut;
+    curl_off_t bytesOutAfterBodyEnd;
+    // The body's size when it is sent with a length, -1 when chunked.
+    curl_off_t bodySize;
+    bool hasBody;
+    bool bodyEnded;
+    // libcurl keeps the last OS error of a transfer, also one from before the
+    // connection stood (a refused address tried first).
+    long errnoAtConnect;
+    bool connected;
+    HttpResponseHead head;
+    // The current head belongs to a redirect being followed or to an
     // interim (1xx) answer: neither is the response, nor is its body.
     bool skippingBlock;
     bool responseDelivered;
+    bool chunkedResponse;
+    // We stopped libcurl on purpose: after a complete final answer it would
+    // have followed, or at a head whose framing cannot be trusted.
+    bool stoppedAfterAnswer;
+    bool badAnswer;
     bool sentReported;
     bool finished;
     // Something was pushed to the caller since the last flush.

@@ -1,6 +1,4 @@
-#include <chrono>
 #include <string>
-#include <thread>
 
 #include "HttpTest.h"
 
@@ -18,19 +16,6 @@ protected:
     void pumpThroughAProbe() {
         Recorder probe(Recorder::get(probeUrl));
         ASSERT_TRUE(Recorder::runAll({&probe}));
-    }
-
-    // Waits without pumping: the engine thread queues, this thread does not
-    // deliver.
-    static bool waitUnpumped(const std::function<bool()>& condition) {
-        const auto end = std::chrono::steady_clock::now() + std::chrono::seconds(10);
-        while (!condition()) {
-            if (std::chrono::steady_clock::now() >= end) {
-                return false;
-            }
-            std::this_thread::sleep_for(std::chrono::milliseconds(1));
-        }
-        return true;
     }
 
     // Runs `action` after the recorder noted `event`.

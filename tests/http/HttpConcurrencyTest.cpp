@@ -1,3 +1,4 @@
+#include <map>
 #include <string>
 #include <vector>
 
@@ -142,4 +143,59 @@ TEST_F(HttpConcurrencyTest, CancelIsReportedToTheCollectorAndAGoneCollectorToNob
     EXPECT_TRUE(cancelled.events.empty());
     EXPECT_EQ(0, orphan.code);
     EXPECT_EQ("fine", orphan.body);
+}
+
+TEST_F(HttpConcurrencyTest, RequestIsReportedSentOnceItHasLeftAnswerOrNot) {
+    // The server takes each request whole, then never answers.
+    const std::string url = serve("/stall", Reply::StallBeforeReply);
+    const std::string payload(300 * 1024, 'p');
+    auto post = [&] { return HttpRequest::create(url.c_str(), "POST", 400, false); };
+    boost::shared_ptr<HttpRequest> streamed = post();
+    streamed->getBodyStream()->write(payload.data(), 1000);
+    boost::shared_ptr<HttpRequest> fixed = post();
+    boost::shared_ptr<HttpRequest::MultipartBuilder> form = HttpRequest::MultipartBuilder::create("b0undary");
+    form->addField("data", payload, true, false, "");
+    fixed->setBody(form->getBoundary(), form->getEncodedContent());
+    boost::shared_ptr<HttpRequest> neverClosed = post();
+    neverClosed->getBodyStream()->write("abc", 3);
+    boost::shared_ptr<RecordingCollector> collector = boost::make_shared<RecordingCollector>();
+    Recorder streamedPost(streamed, true, collector, 1);
+    Recorder get(Recorder::get(url, 400), true, collector, 2);
+    Recorder fixedPost(fixed, true, collector, 3);
+    Recorder openPost(neverClosed, true, collector, 4);
+
+    streamedPost.start();
+    get.start();
+    fixedPost.start();
+    openPost.start();
+    // The GET has left, so the streamed body, started before it, is sent
+    // chunked: its end is written only now.
+    ASSERT_TRUE(waitFor([&] { return collector->count("sent") >= 1; }));
+    streamed->getBodyStream()->write(payload.data() + 1000, static_cast<unsigned int>(payload.size() - 1000));
+    streamed->getBodyStream()->closeWrite();
+    ASSERT_TRUE(waitFor([&] { return collector->count("finished") == 4; }));
+
+    std::map<int, std::vector<std::string> > kinds;
+    std::map<int, long long> sentSizes;
+    for (const RecordingCollector::Report& report : collector->reports()) {
+        kinds[report.id].push_back(report.kind);
+        sentSizes[report.id] += report.kind == "sent" ? report.size : 0;
+    }
+    const std::vector<std::string> sentThenFinished = {"sent", "finished"};
+    EXPECT_EQ(sentThenFinished, kinds[1]);
+    EXPECT_EQ(sentThenFinished, kinds[2]);
+    EXPECT_EQ(sentThenFinished, kinds[3]);
+    // A body that never ended never left.
+    EXPECT_EQ((std::vector<std::string>{"finished"}), kinds[4]);
+    EXPECT_GT(sentSizes[1], static_cast<long long>(payload.size()));
+    EXPECT_GT(sentSizes[2], 0);
+    EXPECT_GT(sentSizes[3], static_cast<long long>(payload.size()));
+    for (Recorder* recorder : {&streamedPost, &get, &fixedPost, &openPost}) {
+        EXPECT_EQ(Network::HTTP_TIMEOUT_ERROR_CODE, recorder->code);
+    }
+    int chunkedBodies = 0;
+    for (const TestHttpServer::Received& received : server->received()) {
+        chunkedBodies += received.header("Transfer-Encoding") == "chunked" ? 1 : 0;
+    }
+    EXPECT_EQ(1, chunkedBodies);
 }

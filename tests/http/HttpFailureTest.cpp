@@ -1,79 +1,10 @@
-#include <arpa/inet.h>
-#include <netinet/in.h>
-#include <poll.h>
-#include <sys/socket.h>
-#include <unistd.h>
-
-#include <atomic>
 #include <set>
 #include <string>
-#include <thread>
 
 #include "HttpTest.h"
+#include "RawReplyServer.h"
 
 using Network::HttpRequest;
-
-namespace {
-
-// A loopback peer that answers every connection with fixed raw bytes, for
-// answers no HTTP server library would produce.
-class RawReplyServer {
-public:
-    explicit RawReplyServer(const std::string& answer) : answer(answer) {
-        listener = ::socket(AF_INET, SOCK_STREAM, 0);
-        sockaddr_in address{};
-        address.sin_family = AF_INET;
-        address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-        socklen_t length = sizeof(address);
-        ::bind(listener, reinterpret_cast<sockaddr*>(&address), sizeof(address));
-        ::listen(listener, 8);
-        ::getsockname(listener, reinterpret_cast<sockaddr*>(&address), &length);
-        port = ntohs(address.sin_port);
-        thread = std::thread([this] { serve(); });
-    }
-    ~RawReplyServer() {
-        stopping = true;
-        thread.join();
-        ::close(listener);
-    }
-    std::string url() const { return "http://127.0.0.1:" + std::to_string(port) + "/raw"; }
-
-private:
-    void serve() {
-        while (!stopping) {
-            pollfd waiting = {listener, POLLIN, 0};
-            if (::poll(&waiting, 1, 20) <= 0) {
-                continue;
-            }
-            int client = ::accept(listener, nullptr, nullptr);
-            if (client < 0) {
-                continue;
-            }
-            readRequestHead(client);
-            ::send(client, answer.data(), answer.size(), MSG_NOSIGNAL);
-            ::close(client);
-        }
-    }
-    static void readRequestHead(int client) {
-        std::string head;
-        char buffer[1024];
-        while (head.find("\r\n\r\n") == std::string::npos) {
-            ssize_t count = ::recv(client, buffer, sizeof(buffer), 0);
-            if (count <= 0) {
-                return;
-            }
-            head.append(buffer, static_cast<std::size_t>(count));
-        }
-    }
-
-    std::string answer;
-    int listener = -1;
-    int port = 0;
-    std::atomic<bool> stopping{false};
-    std::thread thread;
-};
-
-}  // namespace
 
 class HttpFailureTest : public HttpTest {};
 
@@ -124,21 +55,97 @@ TEST_F(HttpFailureTest, RequestsThatCannotBeMadeEndInTheirCodesWithoutTraffic) {
     EXPECT_EQ(0u, server->requestCount());
 }
 
-TEST_F(HttpFailureTest, GarbageAnswersEndInFailureCodesNeverInACrash) {
-    RawReplyServer notHttp("this is not http\r\n\r\n");
-    RawReplyServer badStatus("HTTP/1.1 abc\r\nContent-Length: 2\r\n\r\nok");
-    RawReplyServer shortBody("HTTP/1.1 200 OK\r\nContent-Length: 100\r\n\r\nonly this");
-    RawReplyServer brokenChunks(
-        "HTTP/1.1 200 OK\r\nTransfer-Encoding: chunked\r\n\r\nzz\r\nabc\r\n0\r\n\r\n");
-    RawReplyServer hugeHeader("HTTP/1.1 200 OK\r\nX-Big: " + std::string(400000, 'h') + "\r\n\r\n");
-    RawReplyServer nothing("");
+TEST_F(HttpFailureTest, AnswersThatBreakHttpEndInTheBadResponseCode) {
+    const std::string chunkedHead = "HTTP/1.1 200 OK\r\nTransfer-Encoding: chunked\r\n\r\n";
+    std::string manyFields = "HTTP/1.1 200 OK\r\n";
+    for (int i = 0; i < 400; ++i) {
+        manyFields += "X-Field-" + std::to_string(i) + ": " + std::string(1000, 'v') + "\r\n";
+    }
+    const struct {
+        const char* name;
+        std::string answer;
+    } cases[] = {
+        {"not http", "this is not http\r\n\r\n"},
+        {"unreadable status", "HTTP/1.1 abc\r\nContent-Length: 2\r\n\r\nok"},
+        {"status line then close", "HTTP/1.1 200 OK\r\n"},
+        {"head cut after a field", "HTTP/1.1 200 OK\r\nContent-Type: text/plain\r\n"},
+        {"length not a number", "HTTP/1.1 200 OK\r\nContent-Length: abc\r\n\r\nabc"},
+        {"length too large", "HTTP/1.1 200 OK\r\nContent-Length: 99999999999999999999999\r\n\r\nabc"},
+        {"lengths that disagree", "HTTP/1.1 200 OK\r\nContent-Length: 3\r\nContent-Length: 5\r\n\r\nabcde"},
+        {"chunk size not hex", chunkedHead + "zz\r\nabc\r\n0\r\n\r\n"},
+        {"chunk without its line end", chunkedHead + "3\r\nabcXX0\r\n\r\n"},
+        {"chunk size too large", chunkedHead + "fffffffffffffffffffff\r\nabc\r\n0\r\n\r\n"},
+        {"field line too long", "HTTP/1.1 200 OK\r\nX-Big: " + std::string(400000, 'h') + "\r\n\r\n"},
+        {"head too large", manyFields + "\r\n"},
+    };
+    for (const auto& entry : cases) {
+        SCOPED_TRACE(entry.name);
+        RawReplyServer peer(entry.answer);
 
-    EXPECT_EQ(Network::HTTP_BAD_RESPONSE_ERROR_CODE, fetch(notHttp.url())->code);
-    EXPECT_EQ(Network::HTTP_BAD_RESPONSE_ERROR_CODE, fetch(badStatus.url())->code);
-    EXPECT_EQ(Network::HTTP_CONNECTION_LOST_ERROR_CODE, fetch(shortBody.url())->code);
-    EXPECT_LT(fetch(brokenChunks.url())->code, 0);
-    EXPECT_LT(fetch(hugeHeader.url())->code, 0);
-    EXPECT_EQ(Network::HTTP_CONNECTION_LOST_ERROR_CODE, fetch(nothing.url())->code);
+        std::unique_ptr<Recorder> recorder = fetch(peer.url());
+
+        EXPECT_EQ(Network::HTTP_BAD_RESPONSE_ERROR_CODE, recorder->code);
+        EXPECT_EQ("finished", recorder->events.back());
+        EXPECT_TRUE(recorder->body.empty());
+    }
+}
+
+TEST_F(HttpFailureTest, AnswersCutShortByThePeerEndInTheConnectionLostCode) {
+    RawReplyServer::Options reset;
+    reset.reset = true;
+    const struct {
+        const char* name;
+        std::string answer;
+        RawReplyServer::Options options;
+    } cases[] = {
+        {"nothing", "", RawReplyServer::Options()},
+        {"body shorter than announced", "HTTP/1.1 200 OK\r\nContent-Length: 100\r\n\r\nonly this",
+         RawReplyServer::Options()},
+        {"chunked body closed early", "HTTP/1.1 200 OK\r\nTransfer-Encoding: chunked\r\n\r\n3\r\nabc\r\n",
+         RawReplyServer::Options()},
+        {"reset inside the head", "HTTP/1.1 200 OK\r\nX-A: b\r\n", reset},
+        {"reset inside a chunked body", "HTTP/1.1 200 OK\r\nTransfer-Encoding: chunked\r\n\r\n3\r\nabc\r\n",
+         reset},
+    };
+    for (const auto& entry : cases) {
+        SCOPED_TRACE(entry.name);
+        RawReplyServer peer(entry.answer, entry.options);
+
+        EXPECT_EQ(Network::HTTP_CONNECTION_LOST_ERROR_CODE, fetch(peer.url())->code);
+    }
+}
+
+TEST_F(HttpFailureTest, RepeatedLengthsThatAgreeAreAccepted) {
+    RawReplyServer peer("HTTP/1.1 200 OK\r\nContent-Length: 3\r\nContent-Length: 3\r\n\r\nabc");
+
+    std::unique_ptr<Recorder> recorder = fetch(peer.url());
+
+    EXPECT_EQ(0, recorder->code);
+    EXPECT_EQ("abc", recorder->body);
+    ASSERT_NE(nullptr, recorder->response);
+    EXPECT_EQ(3, recorder->response->getContentLength());
+}
+
+TEST_F(HttpFailureTest, HeadBytesTricklingInKeepTheConnectionAliveButSilenceInsideTheHeadDoesNot) {
+    // One byte every 20 ms: each line takes far longer than the timeout.
+    const std::string answer =
+        "HTTP/1.1 200 OK\r\nX-Padding: " + std::string(40, 'p') + "\r\nContent-Length: 2\r\n\r\nok";
+    RawReplyServer::Options trickling;
+    trickling.byteIntervalMs = 20;
+    RawReplyServer slowPeer(answer, trickling);
+    RawReplyServer::Options silent;
+    silent.stayOpen = true;
+    RawReplyServer stalledPeer("HTTP/1.1 200 OK\r\nX-Padding: ppp", silent);
+
+    std::unique_ptr<Recorder> slow = fetch(slowPeer.url(), 500);
+    std::unique_ptr<Recorder> stalled = fetch(stalledPeer.url(), 300);
+
+    EXPECT_EQ((std::vector<std::string>{"finished"}), stalled->events);
+    EXPECT_EQ(Network::HTTP_TIMEOUT_ERROR_CODE, stalled->code);
+    EXPECT_EQ(0, slow->code);
+    EXPECT_EQ("ok", slow->body);
+    ASSERT_NE(nullptr, slow->response);
+    EXPECT_EQ(std::string(40, 'p'), slow->response->getHeader("X-Padding"));
 }
 
 TEST_F(HttpFailureTest, OfflineAtStartFinishesWithOfflineCodeWithoutTraffic) {

@@ -11,6 +11,7 @@
 #include <memory>
 #include <mutex>
 #include <string>
+#include <thread>
 #include <vector>
 
 #include "network/DataChunk.h"
@@ -33,6 +34,20 @@ inline bool waitFor(const std::function<bool()>& condition,
             return false;
         }
         kdWaitEvent(5 * 1000 * 1000);
+    }
+    return true;
+}
+
+// Waits without pumping: the engine thread queues, this thread does not
+// deliver. False when the bound runs out first.
+inline bool waitUnpumped(const std::function<bool()>& condition,
+                         std::chrono::milliseconds bound = std::chrono::seconds(10)) {
+    const auto end = std::chrono::steady_clock::now() + bound;
+    while (!condition()) {
+        if (std::chrono::steady_clock::now() >= end) {
+            return false;
+        }
+        std::this_thread::sleep_for(std::chrono::milliseconds(1));
     }
     return true;
 }
@@ -141,6 +156,13 @@ public:
     std::vector<Report> reports() const {
         std::lock_guard<std::mutex> lock(mutex);
         return recorded;
+    }
+    long long receivedBytes() const {
+        long long total = 0;
+        for (const Report& report : reports()) {
+            total += report.kind == "chunk" ? report.size : 0;
+        }
+        return total;
     }
     int count(const std::string& kind) const {
         int total = 0;

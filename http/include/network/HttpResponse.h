@@ -23,7 +23,8 @@ public:
     // The first value of the header, matched without regard to case; "" when absent.
     std::string getHeader(const std::string& name) const;
     std::string getContentType() const { return getHeader("Content-Type"); }
-    // The announced body length, or -1 when the server gave none (or a bad one).
+    // The announced body length, or -1 when the server gave none or a bad one
+    // (not plain digits, too large, or repeated with different values).
     long long getContentLength() const;
 
 private:
