@@ -138,6 +138,7 @@ void BaseApp::showView(BaseView* view) {
         kdExit(-1);
         return;
     }
+    view->resumeIfViewRunning();
     Logger::log(Logger::Info, "BaseApp::showView: Time to show: %i ms", millisecondsSince(start));
 }
 

@@ -201,6 +201,17 @@ bool BaseView::onViewResumed() {
     return true;
 }
 
+void BaseView::resumeIfViewRunning() {
+    Lifecycle::PauseResumeHandler* handler = Lifecycle::PauseResumeHandler::getInstance();
+    if (handler == nullptr || handler->getIsViewPaused() || redrawManager == nullptr) {
+        return;
+    }
+    // The order of the event's fan-out: the view registered before its
+    // redraw manager.
+    onViewResumed();
+    redrawManager->onViewResumed();
+}
+
 void BaseView::onKey(int key, int, int) {
     if (key != kKeyAction1) {
         return;

@@ -69,6 +69,12 @@ public:
     bool onResumed() override { return false; }
     bool onViewPaused() override;
     bool onViewResumed() override;
+    // The platform resumes views with event 118 only. A view shown after it
+    // (a screen switch, or shown again after hideView) is resumed here, with
+    // its redraw manager, exactly as that event would have done; BaseApp calls
+    // it once init() has returned. Does nothing while the platform view is
+    // paused or the view already runs.
+    void resumeIfViewRunning();
 
     // Press, fling gesture and release at (x, y), all delivered before return.
     void emulateFling(int x, int y, int dx, int dy);

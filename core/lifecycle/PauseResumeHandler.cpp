@@ -51,7 +51,7 @@ void PauseResumeHandler::destroyHandler(void*) {
     instance = nullptr;
 }
 
-PauseResumeHandler::PauseResumeHandler() : isAppPaused(true) {
+PauseResumeHandler::PauseResumeHandler() : isAppPaused(true), isViewPaused(true) {
     for (int i = 0; i < kHandledEventCount; ++i) {
         kdInstallCallback(&PauseResumeHandler::eventCallbackWrapper, kHandledEvents[i], nullptr);
     }
@@ -90,9 +90,13 @@ void PauseResumeHandler::eventCallback(const KDEvent* event) {
             listeners.notifyAll([](PauseResumeListener& listener) { listener.onResumed(); });
             break;
         case KD_EVENT_VIEW_PAUSE_ZVR:
+            isViewPaused = true;
             listeners.notifyAll([](PauseResumeListener& listener) { listener.onViewPaused(); });
             break;
         case KD_EVENT_VIEW_RESUME_ZVR:
+            // Set first: a view shown by a listener of this very event is not
+            // in the pass and must resume itself.
+            isViewPaused = false;
             listeners.notifyAll([](PauseResumeListener& listener) { listener.onViewResumed(); });
             break;
     }

@@ -20,6 +20,9 @@ public:
     virtual ~PauseResumeHandler();
 
     bool getIsAppPaused() const { return isAppPaused; }
+    // The platform view's state as its last event 117 or 118 told (paused
+    // until the first 118), for views shown after that event.
+    bool getIsViewPaused() const { return isViewPaused; }
 
     void addListener(const boost::weak_ptr<PauseResumeListener>& listener);
     // Unlinks the first registration of listener; false when there is none.
@@ -41,6 +44,7 @@ private:
 
     Util::WeakListenerList<PauseResumeListener> listeners;
     bool isAppPaused;
+    bool isViewPaused;
 
     static PauseResumeHandler* instance;
     static const int registration;

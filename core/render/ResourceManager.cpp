@@ -16,12 +16,15 @@ const size_t kInitialBuckets = 10;
 
 }  // namespace
 
-ResourceManager::ResourceManager() : device(nullptr) {
+ResourceManager::ResourceManager() : device(nullptr), destroyedDuringPump(nullptr) {
     resetContents(contents);
     kdInstallCallback(&ResourceManager::pumpWrapper, KD_EVENT_USER, this);
 }
 
 ResourceManager::~ResourceManager() {
+    if (destroyedDuringPump != nullptr) {
+        *destroyedDuringPump = true;
+    }
     // Also discards a pump event still queued for this manager.
     kdInstallCallback(nullptr, KD_EVENT_USER, this);
     for (Contents::const_iterator it = contents.begin(); it != contents.end(); ++it) {
@@ -149,12 +152,25 @@ void ResourceManager::invalidate() {
     }
 }
 
+// A ready callback may destroy the manager (it hides the view, say): the pass
+// then stops at once, and so does a pass further out on the stack in whose
+// callback this one was pumped.
 void ResourceManager::pump() {
+    bool destroyed = false;
+    bool* const outerPump = destroyedDuringPump;
+    destroyedDuringPump = &destroyed;
     while (!readyDescs.empty()) {
         const ResourceDesc* desc = readyDescs.front();
         readyDescs.pop_front();
         desc->notifyReady();
+        if (destroyed) {
+            if (outerPump != nullptr) {
+                *outerPump = true;
+            }
+            return;
+        }
     }
+    destroyedDuringPump = outerPump;
 }
 
 void ResourceManager::pumpWrapper(const KDEvent* event) {

@@ -80,6 +80,9 @@ private:
     std::deque<boost::shared_ptr<Resource> > waitingResources;
     std::deque<const ResourceDesc*> readyDescs;
     API::GraphicsDevice* device;
+    // Set while pump() runs, so that a pump whose ready callback destroyed
+    // the manager stops touching it.
+    bool* destroyedDuringPump;
 };
 
 }  // namespace Render

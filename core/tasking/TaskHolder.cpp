@@ -2,20 +2,33 @@
 
 #include <KD/kd.h>
 
-#include "tasking/TaskManager.h"
+#include "tasking/impl/TaskManagerImpl.h"
 
 namespace Tasking {
+
+namespace {
+
+// The process-wide manager the held task was submitted to, or null once it
+// is gone: the singleton store may delete it before the holder's owner, and it
+// releases our task with everything else. Asking for the manager again then
+// would make a new one, with a worker thread, in the middle of the teardown.
+TaskManager* liveManager() {
+    return TaskManagerImpl::getExistingInstance();
+}
+
+}  // namespace
 
 TaskHolder::TaskHolder(bool cancelOnDestroy) : cancelOnDestroy(cancelOnDestroy) {}
 
 TaskHolder::~TaskHolder() {
-    if (!task) {
+    TaskManager* manager = task ? liveManager() : nullptr;
+    if (manager == nullptr) {
         return;
     }
     if (cancelOnDestroy) {
-        TaskManager::getInstance()->cancel(task);
+        manager->cancel(task);
     } else {
-        TaskManager::getInstance()->wait(task, false);
+        manager->wait(task, false);
     }
     task.reset();
 }
@@ -31,7 +44,9 @@ void TaskHolder::cancel() {
     if (!task) {
         return;
     }
-    TaskManager::getInstance()->cancel(task);
+    if (TaskManager* manager = liveManager()) {
+        manager->cancel(task);
+    }
     task.reset();
 }
 
@@ -40,9 +55,13 @@ void TaskHolder::wait() {
     if (!task) {
         return;
     }
+    TaskManager* manager = liveManager();
+    if (manager == nullptr) {
+        return;
+    }
     // Keeps the task alive should its onFinished() clear the holder.
     boost::shared_ptr<Task> waited = task;
-    TaskManager::getInstance()->wait(waited, true);
+    manager->wait(waited, true);
 }
 
 void TaskHolder::onFinished() {

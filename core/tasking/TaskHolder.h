@@ -13,6 +13,8 @@ class TaskHolder {
 public:
     // On destruction a task still held is cancelled if cancelOnDestroy is set;
     // otherwise the destructor blocks until it has run (without notifying it).
+    // Once the process-wide manager is gone (platform shutdown), which took
+    // the task with it, the destructor, cancel() and wait() do nothing.
     explicit TaskHolder(bool cancelOnDestroy);
     ~TaskHolder();
 

@@ -14,7 +14,12 @@ class TaskManager {
 public:
     virtual ~TaskManager() {}
 
-    // Queues the task. A task may be scheduled again once it has been notified.
+    // Queues the task. A task may be scheduled again once it has been notified,
+    // consumed by wait() or cancelled (a cancelled running task once its run()
+    // has returned); scheduling it, here or on another manager, while a
+    // manager still holds it is refused with an assertion. A manager whose
+    // worker thread could not start refuses every schedule() and wait() with
+    // an assertion.
     virtual void schedule(const boost::shared_ptr<Task>& task, int priority) = 0;
     // Takes a queued or finished task out without notification. A running task
     // is not interrupted: it runs to its end and is then released on the owner

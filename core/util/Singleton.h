@@ -19,6 +19,9 @@ public:
         }
         return instance;
     }
+    // Null when none exists (not made yet, or deleted at shutdown); makes
+    // nothing.
+    static T* getExistingInstance() { return instance; }
 
 protected:
     Singleton() {}

@@ -2,7 +2,8 @@
 
 namespace Util {
 
-Timer::Timer(callback<void (*)()> onFired) : type(OneShot), onFired(onFired), timer(nullptr) {
+Timer::Timer(callback<void (*)()> onFired)
+    : ownerThread(kdThreadSelf()), type(OneShot), onFired(onFired), timer(nullptr) {
     kdInstallCallback(&Timer::firedWrapper, KD_EVENT_TIMER, this);
 }
 
@@ -12,6 +13,13 @@ Timer::~Timer() {
 }
 
 void Timer::start(TimerType timerType, long long intervalNs) {
+    // A platform timer fires on the thread that sets it, and only the owner
+    // has our handler installed: set anywhere else it would never fire, yet
+    // count as started.
+    KD_ASSERT(kdThreadSelf() == ownerThread);
+    if (kdThreadSelf() != ownerThread) {
+        return;
+    }
     cancel();
     type = timerType;
     timer = kdSetTimer(intervalNs, timerType, this);

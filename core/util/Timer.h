@@ -18,7 +18,8 @@ public:
     explicit Timer(callback<void (*)()> onFired);
     ~Timer();
 
-    // Restarts the timer if it runs. Intervals are nanoseconds.
+    // Restarts the timer if it runs. Intervals are nanoseconds. Called on
+    // another thread, it asserts and changes nothing.
     void start(TimerType timerType, long long intervalNs);
     void cancel();
     bool isStarted() const { return timer != nullptr; }
@@ -29,6 +30,7 @@ private:
     Timer(const Timer&) = delete;
     Timer& operator=(const Timer&) = delete;
 
+    KDThread* const ownerThread;
     TimerType type;
     callback<void (*)()> onFired;
     KDTimer* timer;

@@ -146,6 +146,7 @@ void resetSimulation() {
     detail::resetSensors();
     detail::resetAudio();
     detail::resetGraphics();
+    detail::resetThreads();
 }
 
 namespace detail {

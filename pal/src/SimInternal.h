@@ -12,6 +12,7 @@ void resetRadios();
 void resetSensors();
 void resetAudio();
 void resetGraphics();
+void resetThreads();
 
 // Hands back the payload of a simulated event that is freed without reaching
 // a callback (no callback installed, or its callback removed while the event

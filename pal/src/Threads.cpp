@@ -1,13 +1,16 @@
 // Threads, recursive mutexes, conditions and scheduling classes on pthreads.
 
 #include <KD/kdext.h>
+#include <pal/Simulation.h>
 #include <sched.h>
 
+#include <atomic>
 #include <memory>
 #include <mutex>
 #include <set>
 
 #include "Runtime.h"
+#include "SimInternal.h"
 #include "ThreadRecord.h"
 
 namespace {
@@ -43,6 +46,8 @@ void* threadTrampoline(void* argument) {
     }
     return nullptr;
 }
+
+std::atomic<bool> gCreationRefused{false};
 
 int policyToPosix(KDint policy) { return policy == KD_THREAD_POLICY_BACKGROUND_ZVR ? SCHED_IDLE : SCHED_OTHER; }
 
@@ -90,6 +95,10 @@ void wakeAllThreads() {
 extern "C" {
 
 KDThread* kdThreadCreate(const KDThreadAttr*, void* (*start_routine)(void*), void* arg) {
+    if (gCreationRefused.load()) {
+        kdSetError(KD_ENOMEM);
+        return nullptr;
+    }
     KDThread* thread = new KDThread();
     thread->startRoutine = start_routine;
     thread->startArgument = arg;
@@ -221,3 +230,14 @@ KDint kdThreadCondWait(KDThreadCond* cond, KDThreadMutex* mutex) {
 }
 
 }  // extern "C"
+
+namespace pal {
+
+void setThreadCreationRefused(bool refused) { gCreationRefused.store(refused); }
+
+namespace detail {
+
+void resetThreads() { gCreationRefused.store(false); }
+
+}  // namespace detail
+}  // namespace pal

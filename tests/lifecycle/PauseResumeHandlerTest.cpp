@@ -68,8 +68,11 @@ TEST_F(PauseResumeHandlerTest, AppEventsReachEveryListenerOnceWithThePausedFlagA
     EXPECT_EQ((std::vector<bool>{false, true}), pausedSeen);
 }
 
-TEST_F(PauseResumeHandlerTest, ViewEventsReachListenersAndLeaveTheAppFlag) {
+TEST_F(PauseResumeHandlerTest, ViewEventsReachListenersWithTheViewFlagAlreadySetAndLeaveTheAppFlag) {
     JournalListener listener(&journal, "listener");
+    std::vector<bool> viewPausedSeen;
+    listener.action = [&] { viewPausedSeen.push_back(handler()->getIsViewPaused()); };
+    EXPECT_TRUE(handler()->getIsViewPaused());
     deliver(&pal::postViewResumed);
     EXPECT_TRUE(handler()->getIsAppPaused());
     deliver(&pal::postAppResumed);
@@ -77,6 +80,7 @@ TEST_F(PauseResumeHandlerTest, ViewEventsReachListenersAndLeaveTheAppFlag) {
     EXPECT_FALSE(handler()->getIsAppPaused());
     EXPECT_EQ((std::vector<std::string>{"listener.viewResumed", "listener.resumed", "listener.viewPaused"}),
               journal);
+    EXPECT_EQ((std::vector<bool>{false, false, true}), viewPausedSeen);
 }
 
 TEST_F(PauseResumeHandlerTest, ListenersGoneBeforeOrDuringTheFanOutAreSkippedAndDropped) {

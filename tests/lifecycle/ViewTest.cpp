@@ -316,10 +316,34 @@ TEST_F(ViewTest, HiddenViewDropsItsQueuedRedrawAndIsResumedAgainWhenShownAgain) 
     EXPECT_TRUE(view->journal.empty());
 
     TestApp::get()->showView(view.get());
-    pal::postViewResumed();
-    pump();
     advance(kTick);
     EXPECT_EQ(view->journal, (Journal{"update 16", "draw"}));
+}
+
+TEST_F(ViewTest, ViewShownWhileThePlatformViewRunsResumesAtOnceAndOnlyOnce) {
+    pal::postViewResumed();
+    pump();
+    show();
+    EXPECT_FALSE(view->getIsViewPaused());
+    advance(kTick);
+    EXPECT_EQ(view->journal, (Journal{"size 480x800", "update 16", "draw"}));
+
+    // The resume event arriving late resumes nothing a second time.
+    pal::postViewResumed();
+    pump();
+    advance(10 * kTick);
+    EXPECT_EQ(view->journal, (Journal{"size 480x800", "update 16", "draw"}));
+    EXPECT_EQ(pal::redrawCount(), 1);
+    EXPECT_FALSE(view->getRedrawManager()->getIsTimerStarted());
+
+    // Shown while the platform view is paused, it waits for the event.
+    pal::postViewPaused();
+    pump();
+    TestApp::get()->hideView(view.get());
+    TestApp::get()->showView(view.get());
+    advance(kSecond);
+    EXPECT_TRUE(view->getIsViewPaused());
+    EXPECT_EQ(pal::redrawCount(), 1);
 }
 
 TEST_F(ViewTest, DeletedViewReceivesNoMoreEvents) {

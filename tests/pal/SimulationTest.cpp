@@ -502,4 +502,24 @@ TEST_F(SimulationTest, CaptureSessionsOpenCloseAndCanBeRefused) {
     EXPECT_EQ(pal::openCaptureSessions(), 0);
 }
 
+// --- Threads ------------------------------------------------------------------------
+
+void* returnArgument(void* argument) {
+    return argument;
+}
+
+TEST_F(SimulationTest, RefusedThreadCreationFailsWithOutOfMemoryUntilLifted) {
+    int marker = 0;
+    pal::setThreadCreationRefused(true);
+    EXPECT_EQ(kdThreadCreate(nullptr, returnArgument, &marker), nullptr);
+    EXPECT_EQ(kdGetError(), KD_ENOMEM);
+
+    pal::setThreadCreationRefused(false);
+    KDThread* thread = kdThreadCreate(nullptr, returnArgument, &marker);
+    ASSERT_NE(thread, nullptr);
+    void* result = nullptr;
+    EXPECT_EQ(kdThreadJoin(thread, &result), 0);
+    EXPECT_EQ(result, &marker);
+}
+
 }  // namespace

@@ -73,6 +73,18 @@ void onReady(void* userData) {
     note->journal->push_back("ready " + note->name);
 }
 
+// A ready callback that hides the view, and the view's manager with it.
+struct ManagerDestroyer {
+    boost::scoped_ptr<Render::ResourceManager>* manager;
+    Journal* journal;
+};
+
+void destroyManagerWhenReady(void* userData) {
+    ManagerDestroyer* destroyer = static_cast<ManagerDestroyer*>(userData);
+    destroyer->journal->push_back("ready, destroying the manager");
+    destroyer->manager->reset();
+}
+
 class ResourceManagerTest : public PalTest {
 protected:
     void SetUp() override {
@@ -279,6 +291,31 @@ TEST_F(ResourceManagerTest, DestroyedDescriptorLeavesManagerAndIsNotCalledBack) 
 
     EXPECT_EQ(journal, (Journal{"clear a#1"}));
     EXPECT_EQ(manager->getResourceCount(), 0u);
+}
+
+TEST_F(ResourceManagerTest, ManagerDestroyedByAReadyCallbackCallsNoMoreBack) {
+    boost::shared_ptr<ResourceDesc> a = makeDesc("a", ResourceDesc::OPTIONAL);
+    a->setResourceManager(manager.get());
+    a->loadResource();
+    ManagerDestroyer destroyer{&manager, &journal};
+    a->cacheResource(ResourceDesc::ReadyCallback::make<&destroyManagerWhenReady>(), &destroyer);
+    queueOptional("b");
+    // Both ready before the event loop runs: one pass would call both back.
+    manager->process();
+    manager->process();
+    journal.clear();
+
+    pump();
+
+    EXPECT_FALSE(manager);
+    // The destroyed manager cleared its resources, and called nobody else.
+    Journal readyCalls;
+    for (const std::string& entry : journal) {
+        if (entry.compare(0, 5, "ready") == 0) {
+            readyCalls.push_back(entry);
+        }
+    }
+    EXPECT_EQ(readyCalls, (Journal{"ready, destroying the manager"}));
 }
 
 TEST_F(ResourceManagerTest, DescriptorOutlivingItsManagerCanJoinAnotherOne) {

@@ -4,8 +4,19 @@
 #include "tasking/TaskHolder.h"
 #include "tasking/TaskManager.h"
 #include "tasking/TaskProbes.h"
+#include "util/Singleton.h"
 
 namespace {
+
+// A service made before the task manager, so that the singleton store
+// deletes it, and its holders, after the manager.
+class EarlyService : public Util::Singleton<EarlyService> {
+public:
+    EarlyService() : cancelling(true), waiting(false) {}
+
+    Tasking::TaskHolder cancelling;
+    Tasking::TaskHolder waiting;
+};
 
 class TaskHolderTest : public PalTest {
 protected:
@@ -96,4 +107,22 @@ TEST_F(TaskHolderTest, UseWithoutATaskOrSubmittingASecondIsAnAssertion) {
     holder.submit(probe("second"), 0);
     expectAssertion("!task");
     blocker->open();
+}
+
+TEST_F(TaskHolderTest, HoldersOutlivingTheManagerAtShutdownDoNothing) {
+    EarlyService* service = EarlyService::getInstance();
+    // Held back, so both tasks are still queued when the platform shuts down.
+    Tasking::TaskManager::getInstance()->enableLowProirityMode();
+    boost::shared_ptr<ProbeTask> cancelled = probe("cancelled");
+    boost::shared_ptr<ProbeTask> waited = probe("waited");
+    service->cancelling.submit(cancelled, 0);
+    service->waiting.submit(waited, 0);
+
+    shutdownPal();
+
+    EXPECT_EQ(nullptr, EarlyService::getExistingInstance());
+    EXPECT_EQ(0, countLogLines("adding singleton when isDestroying"));
+    EXPECT_TRUE(journal.read("run").empty());
+    EXPECT_EQ(1, cancelled.use_count());
+    EXPECT_EQ(1, waited.use_count());
 }

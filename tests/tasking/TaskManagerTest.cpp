@@ -1,5 +1,7 @@
 #include <KD/kdext.h>
 
+#include <pal/Simulation.h>
+
 #include <boost/make_shared.hpp>
 #include <boost/weak_ptr.hpp>
 
@@ -203,6 +205,63 @@ TEST_F(TaskManagerTest, CancellingOrWaitingForATaskTheManagerDoesNotHoldIsAnAsse
     manager->wait(notified, true);
     expectAssertion("queued");
     EXPECT_EQ(1, notified->finishedCount);
+}
+
+TEST_F(TaskManagerTest, SchedulingATaskSomeManagerStillHoldsIsRefusedAndChangesNothing) {
+    const std::string refused = "a task may be scheduled again only after its notification";
+    boost::shared_ptr<Tasking::TaskManager> other = Tasking::TaskManager::create();
+    boost::shared_ptr<GateTask> running = runGate(1000);
+    boost::shared_ptr<ProbeTask> task = scheduled("task", 0);
+    manager->schedule(running, 0);
+    expectAssertion(refused);
+    manager->schedule(task, 5);
+    expectAssertion(refused);
+    other->schedule(task, 0);
+    expectAssertion(refused);
+
+    running->open();
+    // Once this gate runs, the task has run and waits for its notification.
+    boost::shared_ptr<GateTask> later = runGate(-1000);
+    manager->schedule(task, 0);
+    expectAssertion(refused);
+    other->schedule(task, 0);
+    expectAssertion(refused);
+    later->open();
+
+    // Notified, it may go again, even from its own onFinished().
+    task->onFinishedHook = [this, &task] {
+        if (task->finishedCount == 1) {
+            manager->schedule(task, 0);
+        }
+    };
+    pumpUntil([&task] { return task->finishedCount >= 2; });
+    other->schedule(task, 0);
+    pumpUntil([&task] { return task->finishedCount >= 3; });
+    EXPECT_EQ((Names{"gate", "task", "gate", "task", "task"}), journal.read("run"));
+    EXPECT_NE(running->runThread, task->runThread);
+}
+
+TEST_F(TaskManagerTest, ManagerWhoseWorkerCouldNotStartRefusesWorkInsteadOfBlocking) {
+    pal::setThreadCreationRefused(true);
+    boost::shared_ptr<Tasking::TaskManager> broken = Tasking::TaskManager::create();
+    pal::setThreadCreationRefused(false);
+    expectAssertion("workerThread != nullptr");
+    EXPECT_EQ(1, countLogLines("TaskManager: cannot start the worker thread"));
+
+    boost::shared_ptr<ProbeTask> task = make("task");
+    broken->schedule(task, 0);
+    expectAssertion("workerThread != nullptr");
+    broken->wait(task, true);
+    expectAssertion("workerThread != nullptr");
+    broken->enableLowProirityMode();
+    broken->disableLowPriorityMode();
+    broken.reset();
+    EXPECT_EQ(1, task.use_count());
+
+    // Refused, the task was never held: a working manager takes it.
+    manager->schedule(task, 0);
+    pumpUntilNotified(task);
+    EXPECT_EQ(Names{"task"}, journal.read("finished"));
 }
 
 TEST_F(TaskManagerTest, WaitingForACancelledRunningTaskIsAnAssertionAndReturns) {

@@ -37,6 +37,11 @@ public:
 
 class TimerTest : public PalTest {};
 
+void* startOneShot(void* timer) {
+    static_cast<Util::Timer*>(timer)->start(Util::Timer::OneShot, kSecond);
+    return nullptr;
+}
+
 }  // namespace
 
 TEST_F(TimerTest, OneShotFiresOnceWhenItsIntervalHasPassedAndCancelOnAnIdleOneDoesNothing) {
@@ -116,4 +121,18 @@ TEST_F(TimerTest, TimerDeletedByItsOwnCallbackStopsCleanly) {
     advanceMs(3000);
     EXPECT_EQ(1, owner.fired);
     EXPECT_EQ(0, pal::activeTimerCount());
+}
+
+TEST_F(TimerTest, StartOnAnotherThreadIsRefusedAndLeavesTheTimerToItsOwner) {
+    TimerOwner owner;
+    KDThread* other = kdThreadCreate(nullptr, startOneShot, owner.timer.get());
+    ASSERT_NE(other, nullptr);
+    kdThreadJoin(other, nullptr);
+    expectAssertion("kdThreadSelf() == ownerThread");
+    EXPECT_FALSE(owner.timer->isStarted());
+    EXPECT_EQ(0, pal::activeTimerCount());
+
+    owner.timer->start(Util::Timer::OneShot, kSecond);
+    advanceMs(1000);
+    EXPECT_EQ(1, owner.fired);
 }

@@ -35,6 +35,8 @@ TaskManagerImpl::TaskManagerImpl()
         kdThreadGetSchedParamZVR(workerThread, &savedSchedPolicy, &savedSchedParam);
     }
     kdThreadMutexUnlock(mutex);
+    // Reported at once, and again by every call the manager refuses.
+    KD_ASSERT(workerThread != nullptr);
 }
 
 TaskManagerImpl::~TaskManagerImpl() {
@@ -60,6 +62,16 @@ TaskManagerImpl::~TaskManagerImpl() {
 }
 
 void TaskManagerImpl::schedule(const boost::shared_ptr<Task>& task, int priority) {
+    if (!hasWorker()) {
+        return;
+    }
+    // Queued twice, a task would run and be notified twice; held by another
+    // manager, its positions would be written by two workers under two locks.
+    const TaskState* previous = static_cast<const TaskState*>(task->state.get());
+    if (previous != nullptr && previous->held) {
+        kdHandleAssertion("a task may be scheduled again only after its notification", __FILE__, __LINE__);
+        return;
+    }
     boost::shared_ptr<TaskState> state = boost::make_shared<TaskState>(this);
     kdThreadMutexLock(mutex);
     task->state = state;
@@ -90,11 +102,15 @@ void TaskManagerImpl::cancel(const boost::shared_ptr<Task>& task) {
             finishedTasks.erase(state->finishedPosition);
             state->finishedPosition = finishedTasks.end();
         }
+        state->held = false;
     }
     kdThreadMutexUnlock(mutex);
 }
 
 void TaskManagerImpl::wait(const boost::shared_ptr<Task>& task, bool notify) {
+    if (!hasWorker()) {
+        return;
+    }
     kdThreadMutexLock(mutex);
     for (;;) {
         if (task && task == currentTask) {
@@ -112,6 +128,7 @@ void TaskManagerImpl::wait(const boost::shared_ptr<Task>& task, bool notify) {
             if (state->finishedPosition != finishedTasks.end()) {
                 finishedTasks.erase(state->finishedPosition);
                 state->finishedPosition = finishedTasks.end();
+                state->held = false;
                 if (notify) {
                     task->onFinished();
                 }
@@ -223,6 +240,7 @@ bool TaskManagerImpl::isHeldBack(const Key& key) const {
 bool TaskManagerImpl::finishCurrentTask() {
     bool wakeWaiter = false;
     if (currentTaskAborted) {
+        static_cast<TaskState*>(currentTask->state.get())->held = false;
         abortedTasks.push_back(std::move(currentTask));
     } else {
         wakeWaiter = currentTask == waitedTask;
@@ -274,7 +292,10 @@ void TaskManagerImpl::notifyFinishedTasks(const bool& destroyed) {
     while (!finishedTasks.empty()) {
         boost::shared_ptr<Task> task = std::move(finishedTasks.front());
         finishedTasks.pop_front();
-        static_cast<TaskState*>(task->state.get())->finishedPosition = finishedTasks.end();
+        TaskState* state = static_cast<TaskState*>(task->state.get());
+        state->finishedPosition = finishedTasks.end();
+        // onFinished() may schedule the task again.
+        state->held = false;
         kdThreadMutexUnlock(mutex);
         task->onFinished();
         task.reset();
@@ -305,6 +326,13 @@ TaskManagerImpl::TaskState* TaskManagerImpl::heldState(const boost::shared_ptr<T
     TaskState* taskState = static_cast<TaskState*>(state);
     KD_ASSERT(taskState->manager == this);
     return taskState->manager == this ? taskState : nullptr;
+}
+
+// Without a worker, queued work would never run and every wait() would block
+// for good: such a manager refuses all work, loudly.
+bool TaskManagerImpl::hasWorker() const {
+    KD_ASSERT(workerThread != nullptr);
+    return workerThread != nullptr;
 }
 
 void TaskManagerImpl::setWorkerSchedParam(KDint policy, KDint param) {

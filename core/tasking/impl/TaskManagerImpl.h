@@ -2,6 +2,7 @@
 
 #include <KD/kd.h>
 
+#include <atomic>
 #include <boost/shared_ptr.hpp>
 #include <cstdint>
 #include <list>
@@ -42,9 +43,13 @@ public:
     class TaskState : public Task::State {
     public:
         // Positions are set under the manager's lock.
-        explicit TaskState(TaskManagerImpl* manager) : manager(manager) {}
+        explicit TaskState(TaskManagerImpl* manager) : manager(manager), held(true) {}
 
         TaskManagerImpl* const manager;
+        // Queued, running, or waiting for its notification. Any manager reads
+        // it, without the holding manager's lock, before scheduling the task:
+        // once it is clear the holding manager never touches the task again.
+        std::atomic<bool> held;
         // The queue's end when not queued.
         Queue::iterator queuePosition;
         // The finished list's end when not waiting for its notification.
@@ -77,6 +82,7 @@ private:
     void notifyFinishedTasks(const bool& destroyed);
     void releaseAbortedTasks();
     TaskState* heldState(const boost::shared_ptr<Task>& task) const;
+    bool hasWorker() const;
     void setWorkerSchedParam(KDint policy, KDint param);
     void releaseTasks();
 

@@ -143,6 +143,12 @@ void injectAcceleration(float x, float y, float z);
 // Samples handed out with event 120 and not dismissed yet.
 int undismissedAccelerations();
 
+// --- Threads -------------------------------------------------------------------
+
+// While refused, kdThreadCreate fails with KD_ENOMEM, as when the system has
+// no threads left.
+void setThreadCreationRefused(bool refused);
+
 // --- Audio capture sessions ---------------------------------------------------
 
 void setCaptureSessionsRefused(bool refused);
