@@ -15,6 +15,7 @@ PACKAGES=(
   libgeographiclib-dev
   clang libclang-rt-14-dev
   locales
+  python3
 )
 
 missing=()

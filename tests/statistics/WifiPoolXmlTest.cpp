@@ -97,7 +97,7 @@ const XmlCase kCases[] = {
          root->addChild(Node(new BssidTag("<&>", "A&B", 0, 1)));
          return Node(root);
      },
-     "<wifipool uuid=\"\" app_version=\"\" app_platform=\"\" clid=\"0\" manufacter=\"Ünï\" "
+     "<wifipool uuid=\"\" app_version=\"\" app_platform=\"\" clid=\"0\" manufacter=\"&#xDC;n&#xEF;\" "
      "model=\"Phone &quot;X&quot; &lt;5&gt; &amp; co\"><r type=\"/a?b&amp;c&lt;d&gt;\"></r>"
      "<bssid name=\"PCY+\" channel=\"0\" sigstr=\"1\" age=\"0\">A&amp;B</bssid></wifipool>"},
 };
@@ -112,6 +112,28 @@ INSTANTIATE_TEST_SUITE_P(Elements, WifiPoolXmlTest, ::testing::ValuesIn(kCases),
                          [](const ::testing::TestParamInfo<XmlCase>& info) {
                              return std::string(info.param.name);
                          });
+
+struct EscapeCase {
+    const char* text;
+    const char* expected;
+};
+
+class EscapeTest : public ::testing::TestWithParam<EscapeCase> {};
+
+TEST_P(EscapeTest, KeepsTheDocumentWellFormedInItsDeclaredEncoding) {
+    EXPECT_EQ(GetParam().expected, NetworkCollectorNode::escape(GetParam().text));
+}
+
+INSTANTIATE_TEST_SUITE_P(Texts, EscapeTest,
+                         ::testing::Values(EscapeCase{"plain text/path?x=1", "plain text/path?x=1"},
+                                           EscapeCase{"\"a\" & <b>", "&quot;a&quot; &amp; &lt;b&gt;"},
+                                           EscapeCase{"\xD0\x98\xD0\xB2", "&#x418;&#x432;"},
+                                           EscapeCase{"\xF0\x9F\x98\x80", "&#x1F600;"},
+                                           EscapeCase{"a\x01\tb", "a&#xFFFD;\tb"},
+                                           EscapeCase{"\xFF", "&#xFFFD;"},
+                                           EscapeCase{"\xC0\x80", "&#xFFFD;&#xFFFD;"},
+                                           EscapeCase{"\xE2\x82", "&#xFFFD;&#xFFFD;"},
+                                           EscapeCase{"\xED\xA0\x80x", "&#xFFFD;&#xFFFD;&#xFFFD;x"}));
 
 class ChunkTagTest : public PalTest {};
 

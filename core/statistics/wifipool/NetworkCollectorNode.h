@@ -29,10 +29,16 @@ public:
 
     // The text with '&', '<', '>' and '"' replaced by entities, so that any
     // value a device reports (a model name with a quote, a path with "&")
-    // keeps the document well-formed.
+    // keeps the document well-formed. Text is taken as UTF-8; every non-ASCII
+    // character becomes a character reference, because the document declares
+    // windows-1251 and raw UTF-8 bytes are not valid there. Bytes that are no
+    // character, and control characters XML forbids, become U+FFFD.
     static std::string escape(const std::string& text);
 
 private:
+    // Writes the character starting at text[start]; gives the bytes used.
+    static std::size_t appendCharacterReference(const std::string& text, std::size_t start, std::string& out);
+
     std::vector<boost::shared_ptr<NetworkCollectorNode> > children;
 };
 
