@@ -38,7 +38,9 @@ bool endsWithPartialPage(const unsigned char* data, size_t size) {
 OggVorbisDecoder::OggVorbisDecoder(SoundDataBuffer& output, const SoundDataBuffer& input)
     : output(output), input(input) {}
 
-OggVorbisDecoder::~OggVorbisDecoder() { closeOggVorbisFile(); }
+OggVorbisDecoder::~OggVorbisDecoder() {
+    closeOggVorbisFile();
+}
 
 size_t OggVorbisDecoder::readOgg(void* ptr, size_t size, size_t count, void* source) {
     OggVorbisDecoder* decoder = static_cast<OggVorbisDecoder*>(source);
@@ -79,7 +81,9 @@ int OggVorbisDecoder::seekOgg(void* source, ogg_int64_t offset, int whence) {
     return 0;
 }
 
-int OggVorbisDecoder::closeOgg(void*) { return 0; }
+int OggVorbisDecoder::closeOgg(void*) {
+    return 0;
+}
 
 long OggVorbisDecoder::tellOgg(void* source) {
     return static_cast<long>(static_cast<OggVorbisDecoder*>(source)->readPosition);

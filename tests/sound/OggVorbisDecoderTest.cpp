@@ -1,5 +1,3 @@
-#include "sound/OggVorbisDecoder.h"
-
 #include <gtest/gtest.h>
 
 #include <cmath>
@@ -7,8 +5,9 @@
 #include <cstdio>
 #include <vector>
 
-#include "support/PalTest.h"
+#include "sound/OggVorbisDecoder.h"
 #include "sound/VorbisTestData.h"
+#include "support/PalTest.h"
 
 using Sound::OggVorbisDecoder;
 using Sound::SoundDataBuffer;
@@ -72,7 +71,8 @@ struct Layout {
     long samples;
 };
 
-class OggVorbisDecoderLayoutTest : public OggVorbisDecoderTest, public ::testing::WithParamInterface<Layout> {};
+class OggVorbisDecoderLayoutTest : public OggVorbisDecoderTest,
+                                   public ::testing::WithParamInterface<Layout> {};
 
 TEST_P(OggVorbisDecoderLayoutTest, DecodesEverySampleOfEveryChannel) {
     const Layout layout = GetParam();
@@ -119,7 +119,8 @@ TEST_F(OggVorbisDecoderTest, NonVorbisInputLeavesOutputUntouched) {
 TEST_F(OggVorbisDecoderTest, TruncatedFileFailsWithEmptyOutput) {
     const std::vector<unsigned char> whole = makeVorbisFile(2, 44100, 3 * 44100);
     for (size_t keep : {whole.size() / 2, whole.size() - 100, whole.size() - 1}) {
-        const SoundDataBuffer input = bufferOf(std::vector<unsigned char>(whole.begin(), whole.begin() + keep));
+        const SoundDataBuffer input =
+            bufferOf(std::vector<unsigned char>(whole.begin(), whole.begin() + keep));
         SoundDataBuffer output = bufferOf({7, 7});
         EXPECT_FALSE(OggVorbisDecoder(output, input).decode()) << keep;
         EXPECT_TRUE(output.data.empty()) << keep;
