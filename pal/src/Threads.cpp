@@ -8,6 +8,7 @@
 #include <memory>
 #include <mutex>
 #include <set>
+#include <thread>
 
 #include "Runtime.h"
 #include "SimInternal.h"
@@ -50,6 +51,26 @@ void* threadTrampoline(void* argument) {
 std::atomic<bool> gCreationRefused{false};
 
 int policyToPosix(KDint policy) { return policy == KD_THREAD_POLICY_BACKGROUND_ZVR ? SCHED_IDLE : SCHED_OTHER; }
+
+// Linux lets any thread into SCHED_IDLE, but only a process with CAP_SYS_NICE
+// or an RLIMIT_NICE of 20 may take it out again. Rather than model those
+// rules, a throw-away thread tries the round trip, once per process.
+bool probeIdleClassIsLeavable() {
+    bool leavable = false;
+    std::thread probe([&leavable] {
+        sched_param posixParam{};
+        if (pthread_setschedparam(pthread_self(), SCHED_IDLE, &posixParam) == 0) {
+            leavable = pthread_setschedparam(pthread_self(), SCHED_OTHER, &posixParam) == 0;
+        }
+    });
+    probe.join();
+    return leavable;
+}
+
+bool idleClassIsLeavable() {
+    static const bool leavable = probeIdleClassIsLeavable();
+    return leavable;
+}
 
 }  // namespace
 
@@ -159,6 +180,13 @@ KDint kdThreadSetSchedParamZVR(KDThread* thread, KDint policy, const KDint* para
     if (thread == nullptr || param == nullptr ||
         (policy != KD_THREAD_POLICY_NORMAL_ZVR && policy != KD_THREAD_POLICY_BACKGROUND_ZVR)) {
         kdSetError(KD_EINVAL);
+        return -1;
+    }
+    // A thread demoted for good would starve behind every busy process, so
+    // the demotion is refused unless it can be undone.
+    if (policy == KD_THREAD_POLICY_BACKGROUND_ZVR && thread->schedPolicy.load() != policy &&
+        !idleClassIsLeavable()) {
+        kdSetError(KD_EACCES);
         return -1;
     }
     // Both Linux classes used here take priority 0; the parameter is kept so

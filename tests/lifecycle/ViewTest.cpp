@@ -125,11 +125,18 @@ TEST_F(ViewTest, ShowingCreatesTheManagersAndHidingDeletesThem) {
     EXPECT_EQ(view->getRedrawManager(), nullptr);
     expectAssertion("redrawManager != nullptr");
 
-    // Its callbacks stay installed; input and orientation find no manager.
+    // Its callbacks stay installed: input still reaches the view though there is no manager to
+    // wake, and an orientation change has no manager to schedule a frame with.
+    const int redraws = pal::redrawCount();
     pal::postPointerMove(view.get(), 5, 6);
+    pal::postPointerSelect(view.get(), true);
+    pal::postPointerMove(view.get(), 7, 8);
+    pal::postPointerSelect(view.get(), false);
     pal::postViewEvent(view.get(), KD_EVENT_ORIENTATION);
     pump();
-    EXPECT_TRUE(view->journal.empty());
+    advance(kSecond);
+    EXPECT_EQ(view->journal, (Journal{"pressed 5,6", "moved 7,8", "released 7,8"}));
+    EXPECT_EQ(pal::redrawCount(), redraws);
 }
 
 TEST_F(ViewTest, ResumedViewReadsItsSizeDrawsOneFrameIntoTheContextAndThenCostsNoWakeUps) {

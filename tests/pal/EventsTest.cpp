@@ -1,6 +1,9 @@
 // Event dispatch, cross-thread posting and waiting, threads of the platform.
+#include <sched.h>
+
 #include <atomic>
 #include <string>
+#include <thread>
 #include <utility>
 #include <vector>
 
@@ -172,6 +175,9 @@ TEST(ThreadsTest, MutexIsRecursive) {
 }
 
 TEST(ThreadsTest, BackgroundClassIsSetAndRestored) {
+    if (!backgroundClassGranted()) {
+        GTEST_SKIP() << backgroundClassSkipReason();
+    }
     KDThread* self = kdThreadSelf();
     KDint savedPolicy = -1;
     KDint savedParam = -1;
@@ -182,10 +188,35 @@ TEST(ThreadsTest, BackgroundClassIsSetAndRestored) {
     KDint param = -1;
     kdThreadGetSchedParamZVR(self, &policy, &param);
     EXPECT_EQ(policy, KD_THREAD_POLICY_BACKGROUND_ZVR);
+    EXPECT_EQ(sched_getscheduler(0), SCHED_IDLE);
     ASSERT_EQ(kdThreadSetSchedParamZVR(self, savedPolicy, &savedParam), 0);
     kdThreadGetSchedParamZVR(self, &policy, &param);
     EXPECT_EQ(policy, savedPolicy);
+    EXPECT_EQ(sched_getscheduler(0), SCHED_OTHER);
     EXPECT_EQ(kdThreadSetSchedParamZVR(self, 7, &zero), -1);
+}
+
+TEST(ThreadsTest, BackgroundClassIsRefusedWhenTheThreadCouldNotLeaveIt) {
+    if (backgroundClassGranted()) {
+        GTEST_SKIP() << "this process may leave the background class, so it is granted";
+    }
+    // On a thread of its own: if the refusal broke, this one would be stuck.
+    KDint result = 0;
+    KDint error = 0;
+    KDint policy = -1;
+    int posixPolicy = -1;
+    std::thread demoted([&] {
+        const KDint zero = 0;
+        result = kdThreadSetSchedParamZVR(kdThreadSelf(), KD_THREAD_POLICY_BACKGROUND_ZVR, &zero);
+        error = kdGetError();
+        kdThreadGetSchedParamZVR(kdThreadSelf(), &policy, nullptr);
+        posixPolicy = sched_getscheduler(0);
+    });
+    demoted.join();
+    EXPECT_EQ(result, -1);
+    EXPECT_EQ(error, KD_EACCES);
+    EXPECT_EQ(policy, KD_THREAD_POLICY_NORMAL_ZVR);
+    EXPECT_EQ(posixPolicy, SCHED_OTHER);
 }
 
 // Payloads of events that never reach a callback are released all the same.

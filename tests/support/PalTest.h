@@ -1,6 +1,7 @@
 #pragma once
 
 #include <KD/kd.h>
+#include <KD/kdext.h>
 #include <gtest/gtest.h>
 #include <pal/Simulation.h>
 #include <stdlib.h>
@@ -10,9 +11,28 @@
 #include <filesystem>
 #include <mutex>
 #include <string>
+#include <thread>
 #include <vector>
 
 #include "util/SingletonStorage.h"
+
+// Whether the platform moves threads of this process into the background
+// class: only when it could take them out again, which on Linux needs
+// CAP_SYS_NICE or an RLIMIT_NICE of 20. Asked on a thread of its own.
+inline bool backgroundClassGranted() {
+    KDint result = -1;
+    std::thread probe([&result] {
+        const KDint zero = 0;
+        result = kdThreadSetSchedParamZVR(kdThreadSelf(), KD_THREAD_POLICY_BACKGROUND_ZVR, &zero);
+    });
+    probe.join();
+    return result == 0;
+}
+
+// The reason given by tests that skip without that privilege.
+inline const char* backgroundClassSkipReason() {
+    return "leaving the background class again needs CAP_SYS_NICE or an RLIMIT_NICE of 20";
+}
 
 // Boots the platform layer for one test: a fresh host folder as file root, a
 // virtual clock, a recording assertion handler (which returns, so the code

@@ -48,7 +48,9 @@ KDint kdAddPalCallbacksZVR(KDPalInitFuncZVR *onInit, KDPalShutdownFuncZVR *onShu
 KDboolean kdThreadIsMainZVR(void);
 void kdThreadYieldZVR(void);
 /* Policy 0 is the normal class; policy 1 with parameter 0 is the background
- * class (runs only when nothing else wants the processor). */
+ * class (runs only when nothing else wants the processor). A thread is only
+ * moved into the background class when the process may move it back: else
+ * the call fails with KD_EACCES and the thread keeps its class. */
 #define KD_THREAD_POLICY_NORMAL_ZVR 0
 #define KD_THREAD_POLICY_BACKGROUND_ZVR 1
 KDint kdThreadGetSchedParamZVR(KDThread *thread, KDint *policy, KDint *param);
