@@ -61,9 +61,12 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
         std::abort();
     }
 
-    static boost::shared_ptr<NetworkCollectorWrapper> feature = boost::make_shared<NetworkCollectorWrapper>();
+    // Kept for the whole process and never destroyed: at exit the platform's
+    // thread record is gone before static destructors would run.
+    static boost::shared_ptr<NetworkCollectorWrapper>* feature =
+        new boost::shared_ptr<NetworkCollectorWrapper>(boost::make_shared<NetworkCollectorWrapper>());
     TiXmlDocument answer;
     answer.Parse(std::string(reinterpret_cast<const char*>(data), size).c_str());
-    feature->parseStartup(answer);
+    (*feature)->parseStartup(answer);
     return 0;
 }
