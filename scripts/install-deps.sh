@@ -8,13 +8,15 @@ PACKAGES=(
   libboost-dev zlib1g-dev libminizip-dev libtinyxml-dev
   libprotobuf-dev protobuf-compiler
   libpng-dev libjpeg-dev libjpeg-turbo-progs
-  libogg-dev libspeex-dev libvorbis-dev libopenal-dev
+  libogg-dev libspeex-dev libvorbis-dev libopenal-dev speex vorbis-tools
   libgles-dev libegl-dev libegl-mesa0 libgl1-mesa-dri
   libcurl4-openssl-dev libcpp-httplib-dev
   libgtest-dev libgmock-dev libbenchmark-dev
   libgeographiclib-dev
+  zip
   clang libclang-rt-14-dev
   locales
+  python3
 )
 
 missing=()

@@ -118,8 +118,14 @@ void FileManager::scanDirectory(const char* dir, std::vector<std::string>& out, 
     for (KDDirent* entry = kdReadDir(handle); entry; entry = kdReadDir(handle)) {
         std::string name = entry->d_name;
         std::string path = std::string(dir) + "/" + name;
+        // A link to a folder is not followed: it may lead back up the tree and never end. A link
+        // to a file is listed as the file.
         KDStat info;
-        if (kdStat(path.c_str(), &info) != 0) {
+        if (kdLstatZVR(path.c_str(), &info) != 0) {
+            continue;
+        }
+        const bool link = KD_ISLNK_ZVR(info.st_mode);
+        if (link && (kdStat(path.c_str(), &info) != 0 || KD_ISDIR(info.st_mode))) {
             continue;
         }
         if (!KD_ISDIR(info.st_mode)) {

@@ -37,7 +37,8 @@ public:
 
     // Appends the full paths of the files in dir that end with suffix (all files when suffix is
     // null or empty), descending into folders when recursive. Output is appended, never
-    // cleared; an unreadable dir is logged and leaves it untouched.
+    // cleared; an unreadable dir is logged and leaves it untouched. A symbolic link to a folder
+    // is not followed (it may lead back up the tree); a link to a file is listed like the file.
     static void scanDirectory(const char* dir, std::vector<std::string>& out, const char* suffix,
                               bool recursive);
 };

@@ -15,8 +15,8 @@ public:
     ~WrappedInputStream() override;
 
     long long available() override;
-    // Never reads outside the window: asking for more than is left is a caller error and
-    // delivers only what is left.
+    // Never reads outside the window: asking for more than is left is a bad state (an exception
+    // once exceptions are enabled) and delivers only what is left.
     int read(void* buffer, int length) override;
     long long tell() override;
     // Positions outside the window are clamped to its ends.

@@ -9,23 +9,11 @@
 
 namespace Location {
 
-namespace {
-
-Location initialLocation() {
-    Location location(RawLocation::unknown);
-    location.speedXY = -1;
-    location.bearingXY = -1.0f;
-    location.accuracyXY = -1;
-    return location;
-}
-
-}  // namespace
-
 LocationManager::LocationManager()
     : locationProviderGPS(new LocationProviderGPS(this)),
       locationProviderWireless(new LocationProviderWireless(this)),
       pauseResumeListenerWrapper(boost::make_shared<Lifecycle::PauseResumeListenerWrapper>(this)),
-      lastLocation(initialLocation()),
+      lastLocation(RawLocation::unknown),
       precision(PrecisionNone),
       isPaused(true) {
     Lifecycle::PauseResumeHandler* handler = Lifecycle::PauseResumeHandler::getInstance();

@@ -38,6 +38,10 @@ void ThreadCallback::asyncPerformIfDifferentThread(Function function,
         function(context);
         return;
     }
+    asyncPerform(function, context);
+}
+
+void ThreadCallback::asyncPerform(Function function, const boost::shared_ptr<Context>& context) {
     PostedCall* call = new PostedCall{function, context, nullptr, nullptr};
     link(call);
     KDEvent* event = kdCreateEvent();

@@ -32,6 +32,9 @@ public:
     // On the owner thread, runs function(context) before returning; elsewhere
     // queues it for the owner thread and returns at once.
     void asyncPerformIfDifferentThread(Function function, const boost::shared_ptr<Context>& context);
+    // Queues function(context) for the owner thread even when called there,
+    // so that calls from several threads keep one order. Any thread.
+    void asyncPerform(Function function, const boost::shared_ptr<Context>& context);
 
     static void callbackWrapper(const KDEvent* event);
 

@@ -5,9 +5,11 @@
 
 #include <climits>
 #include <cstdlib>
+#include <cstring>
 
 #include "io/ByteArrayInputStream.h"
 #include "io/zip/GzipInputStream.h"
+#include "util/Logger.h"
 #include "util/TagCollectionHandler.h"
 
 namespace Util {
@@ -33,6 +35,141 @@ const char* textOf(const TiXmlElement* element) {
 
 const TiXmlElement* childOf(const TiXmlElement* element, const char* name) {
     return element ? element->FirstChildElement(name) : nullptr;
+}
+
+bool startsWith(const char* text, const char* prefix) {
+    return std::strncmp(text, prefix, std::strlen(prefix)) == 0;
+}
+
+bool isSpace(char c) {
+    return c == ' ' || c == '\t' || c == '\n' || c == '\r';
+}
+
+// TinyXML takes any byte from 127 up for a letter, so such a byte starts an element too.
+bool startsName(char c) {
+    unsigned char byte = static_cast<unsigned char>(c);
+    return (byte >= 'a' && byte <= 'z') || (byte >= 'A' && byte <= 'Z') || byte == '_' || byte >= 127;
+}
+
+bool isNameChar(char c) {
+    return startsName(c) || (c >= '0' && c <= '9') || c == '-' || c == '.' || c == ':';
+}
+
+const char* skipSpace(const char* p) {
+    while (isSpace(*p)) {
+        ++p;
+    }
+    return p;
+}
+
+// The end ('>') of an XML declaration whose body (after "<?xml") is plain name="value" pairs,
+// values without spaces or quotes; null for anything else. TinyXML honours the quotes of some
+// declaration attributes and not of others, so only where both readings meet at the same '>' do
+// we know where it resumes.
+const char* plainDeclarationEnd(const char* p) {
+    for (;;) {
+        const char* name = skipSpace(p);
+        if (*name == '?' || *name == '>') {
+            p = *name == '?' ? name + 1 : name;
+            return *p == '>' ? p : nullptr;
+        }
+        if (name == p || !startsName(*name)) {
+            return nullptr;
+        }
+        while (isNameChar(*name)) {
+            ++name;
+        }
+        const char* value = skipSpace(name);
+        if (*value != '=') {
+            return nullptr;
+        }
+        value = skipSpace(value + 1);
+        const char quote = *value;
+        if (quote != '"' && quote != '\'') {
+            return nullptr;
+        }
+        for (++value; *value != quote; ++value) {
+            if (*value == '\0' || *value == '"' || *value == '\'' || *value == '<' || *value == '>' ||
+                isSpace(*value)) {
+                return nullptr;
+            }
+        }
+        p = value + 1;
+    }
+}
+
+// The '>' that ends the element tag opening at p, stepping over quoted attribute values as
+// TinyXML does; null when the text ends first.
+const char* elementTagEnd(const char* p) {
+    while (*p != '\0' && *p != '>') {
+        if (*p != '=') {
+            ++p;
+            continue;
+        }
+        p = skipSpace(p + 1);
+        if (*p == '"' || *p == '\'') {
+            p = std::strchr(p + 1, *p);
+            if (!p) {
+                return nullptr;
+            }
+            ++p;
+        }
+    }
+    return *p == '>' ? p : nullptr;
+}
+
+bool isDeclarationStart(const char* p) {
+    if (!startsWith(p, "<?")) {
+        return false;
+    }
+    for (int i = 0; i < 3; ++i) {
+        char c = p[2 + i];
+        if (c >= 'A' && c <= 'Z') {
+            c = static_cast<char>(c - 'A' + 'a');
+        }
+        if (c != "xml"[i]) {
+            return false;
+        }
+    }
+    return true;
+}
+
+// Walks the text as TinyXML will and tells whether it nests deeper than maxDepth elements. TinyXML
+// parses a level per stack frame, so this must run first. Where TinyXML would stop with an error
+// the walk may stop as well; where its reading is unclear (an odd XML declaration) the document
+// counts as too deep.
+bool nestsDeeperThan(const char* text, int maxDepth) {
+    int depth = 0;
+    for (const char* p = std::strchr(text, '<'); p; p = std::strchr(p, '<')) {
+        const char* end;
+        if (startsWith(p, "<!--")) {
+            end = std::strstr(p + 4, "-->");
+            end = end ? end + 2 : nullptr;
+        } else if (startsWith(p, "<![CDATA[")) {
+            end = std::strstr(p + 9, "]]>");
+            end = end ? end + 2 : nullptr;
+        } else if (isDeclarationStart(p)) {
+            end = plainDeclarationEnd(p + 5);
+            if (!end) {
+                return true;
+            }
+        } else if (p[1] == '/') {
+            depth = depth > 0 ? depth - 1 : 0;
+            end = std::strchr(p, '>');
+        } else if (startsName(p[1])) {
+            end = elementTagEnd(p + 1);
+            if (end && end[-1] != '/' && ++depth > maxDepth) {
+                return true;
+            }
+        } else {
+            end = std::strchr(p, '>');
+        }
+        if (!end) {
+            return false;
+        }
+        p = end + 1;
+    }
+    return false;
 }
 
 }  // namespace
@@ -62,11 +199,16 @@ bool XmlUtils::load(IO::InputStream* stream, TiXmlDocument& doc) {
     // keeps every such step inside the buffer and ends the parse there.
     const int kTerminatorPadding = 8;
     const long long left = stream->available();
-    const int size = left <= 0 ? 0 : (left >= INT_MAX - kTerminatorPadding ? INT_MAX - kTerminatorPadding
-                                                                            : static_cast<int>(left));
+    const int size = left <= 0 ? 0
+                               : (left >= INT_MAX - kTerminatorPadding ? INT_MAX - kTerminatorPadding
+                                                                       : static_cast<int>(left));
     std::vector<char> text(static_cast<size_t>(size) + kTerminatorPadding, '\0');
     const int got = size > 0 ? stream->read(text.data(), size) : 0;
     text[got > 0 ? got : 0] = '\0';
+    if (nestsDeeperThan(text.data(), kMaxDepth)) {
+        Logger::log(Logger::Error, "XmlUtils::load()[document nested deeper than %d levels]", kMaxDepth);
+        return false;
+    }
     doc.Parse(text.data(), nullptr, TIXML_DEFAULT_ENCODING);
     return !doc.Error();
 }

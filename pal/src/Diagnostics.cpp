@@ -84,10 +84,16 @@ void kdHandleAssertion(const KDchar* condition, const KDchar* filename, KDint li
         }
     }
     kdLogFormatMessage("%s:%d: Assertion failed: %s", filename, linenumber, condition);
+#ifndef NDEBUG
+    // A debug build stops where the fault is; a release build keeps the user's
+    // application running, so the code after every assertion must be safe.
     std::abort();
+#endif
 }
 
-void kdLogMessage(const KDchar* string) { pal::detail::writeLogLine(string != nullptr ? string : ""); }
+void kdLogMessage(const KDchar* string) {
+    pal::detail::writeLogLine(string != nullptr ? string : "");
+}
 
 void kdLogFormatMessage(const KDchar* format, ...) {
     va_list ap;

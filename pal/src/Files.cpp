@@ -46,6 +46,7 @@ namespace {
 
 const KDmode kRegularFileMode = 0x8000;
 const KDmode kDirectoryMode = 0x4000;
+const KDmode kSymbolicLinkMode = 0x2000;
 
 int fail(KDint error) {
     kdSetError(error);
@@ -115,6 +116,9 @@ KDmode platformMode(mode_t hostMode) {
     }
     if (S_ISDIR(hostMode)) {
         return kDirectoryMode;
+    }
+    if (S_ISLNK(hostMode)) {
+        return kSymbolicLinkMode;
     }
     return 0;
 }
@@ -451,6 +455,22 @@ KDint kdStat(const KDchar* pathname, KDStat* buf) {
     }
     struct stat hostStat;
     if (retryOnEintr([&] { return stat(mapped.host.c_str(), &hostStat); }) != 0) {
+        return failFromErrno();
+    }
+    fillStat(hostStat, buf);
+    return 0;
+}
+
+KDint kdLstatZVR(const KDchar* pathname, KDStat* buf) {
+    MappedPath mapped;
+    if (!mapOrFail(pathname, mapped)) {
+        return -1;
+    }
+    if (buf == nullptr) {
+        return fail(KD_EINVAL);
+    }
+    struct stat hostStat;
+    if (retryOnEintr([&] { return lstat(mapped.host.c_str(), &hostStat); }) != 0) {
         return failFromErrno();
     }
     fillStat(hostStat, buf);

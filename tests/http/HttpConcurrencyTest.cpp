@@ -149,14 +149,15 @@ TEST_F(HttpConcurrencyTest, RequestIsReportedSentOnceItHasLeftAnswerOrNot) {
     // The server takes each request whole, then never answers.
     const std::string url = serve("/stall", Reply::StallBeforeReply);
     const std::string payload(300 * 1024, 'p');
-    auto post = [&] { return HttpRequest::create(url.c_str(), "POST", 400, false); };
-    boost::shared_ptr<HttpRequest> streamed = post();
+    auto post = [&](int timeoutMs) { return HttpRequest::create(url.c_str(), "POST", timeoutMs, false); };
+    // Waits for the test thread to write the rest of its body: patient.
+    boost::shared_ptr<HttpRequest> streamed = post(3000);
     streamed->getBodyStream()->write(payload.data(), 1000);
-    boost::shared_ptr<HttpRequest> fixed = post();
+    boost::shared_ptr<HttpRequest> fixed = post(400);
     boost::shared_ptr<HttpRequest::MultipartBuilder> form = HttpRequest::MultipartBuilder::create("b0undary");
     form->addField("data", payload, true, false, "");
     fixed->setBody(form->getBoundary(), form->getEncodedContent());
-    boost::shared_ptr<HttpRequest> neverClosed = post();
+    boost::shared_ptr<HttpRequest> neverClosed = post(400);
     neverClosed->getBodyStream()->write("abc", 3);
     boost::shared_ptr<RecordingCollector> collector = boost::make_shared<RecordingCollector>();
     Recorder streamedPost(streamed, true, collector, 1);

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <boost/make_shared.hpp>
+#include <filesystem>
 
 #include "IoTest.h"
 #include "io/FileManager.h"
@@ -143,6 +144,19 @@ TEST_F(FileManagerTest, ResourcesOpenAndReadOnSeveralThreadsAtOnce) {
     }
     EXPECT_EQ(20, matches[0]);
     EXPECT_EQ(20, matches[1]);
+}
+
+TEST_F(FileManagerTest, ScanDirectoryListsLinkedFilesButNeverFollowsALinkedFolder) {
+    writeFile("/data/scan/a.png", Bytes());
+    writeFile("/data/other/b.png", Bytes());
+    std::filesystem::create_directory_symlink("..", hostPath("/data/scan") + "/up");
+    std::filesystem::create_directory_symlink(hostPath("/data/other"), hostPath("/data/scan") + "/other");
+    std::filesystem::create_symlink(hostPath("/data/other/b.png"), hostPath("/data/scan") + "/linked.png");
+    std::filesystem::create_symlink("missing.png", hostPath("/data/scan") + "/dangling.png");
+    std::vector<std::string> out;
+    FileManager::scanDirectory("/data/scan", out, ".png", true);
+    std::sort(out.begin(), out.end());
+    EXPECT_EQ((std::vector<std::string>{"/data/scan/a.png", "/data/scan/linked.png"}), out);
 }
 
 TEST_F(FileManagerTest, ScanDirectoryAppendsMatchingFilesDepthFirstAndLeavesTheOutputAloneForAMissingFolder) {

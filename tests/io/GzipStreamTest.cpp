@@ -36,6 +36,21 @@ protected:
         out.resize(size);
         return out;
     }
+
+    // Also independent of our streams: zlib deflating straight into the gzip format.
+    static Bytes zlibGzip(const Bytes& data, int level = Z_DEFAULT_COMPRESSION) {
+        z_stream zs = {};
+        deflateInit2(&zs, level, Z_DEFLATED, 31, 8, Z_DEFAULT_STRATEGY);
+        Bytes out(deflateBound(&zs, data.size()));
+        zs.next_in = const_cast<Bytef*>(data.data());
+        zs.avail_in = static_cast<uInt>(data.size());
+        zs.next_out = out.data();
+        zs.avail_out = static_cast<uInt>(out.size());
+        deflate(&zs, Z_FINISH);
+        out.resize(zs.total_out);
+        deflateEnd(&zs);
+        return out;
+    }
 };
 
 }  // namespace
@@ -114,15 +129,74 @@ TEST_F(GzipStreamTest, ATruncatedStreamIsEmptyAtEveryCut) {
     EXPECT_GT(countLogLines("GzipInputStream::read error -5"), 0);
 }
 
-TEST_F(GzipStreamTest, ACorruptStreamIsEmptyOrPassedThroughButNeverGarbled) {
+TEST_F(GzipStreamTest, ACorruptStreamIsEmptyOrWholeButNeverGarbled) {
     Bytes data = pattern(3000);
     Bytes compressed = gzip(data);
     for (size_t at = 0; at < compressed.size(); at += 5) {
         Bytes corrupt = compressed;
         corrupt[at] ^= 0x5A;
         Bytes result = gunzip(corrupt);
-        EXPECT_TRUE(result.empty() || result == corrupt || result == data) << at;
+        // Only without its gzip magic is the input plain content.
+        EXPECT_TRUE(result.empty() || result == data || (at < 2 && result == corrupt)) << at;
     }
+}
+
+TEST_F(GzipStreamTest, DamagedCompressedDataFailsInsteadOfPassingThrough) {
+    const Bytes data = pattern(20000);
+    const Bytes gzipped = zlibGzip(data);
+    const Bytes zlibbed = zlibCompress(data);
+    auto damaged = [](Bytes bytes, size_t at, unsigned char value) {
+        bytes[at] = value;
+        return bytes;
+    };
+    const Bytes cases[] = {
+        damaged(gzipped, gzipped.size() - 8,
+                static_cast<unsigned char>(~gzipped[gzipped.size() - 8])),  // CRC
+        damaged(gzipped, gzipped.size() - 1, 0xff),                         // size
+        damaged(gzipped, gzipped.size() / 2,
+                static_cast<unsigned char>(~gzipped[gzipped.size() / 2])),  // block
+        damaged(gzipped, 10, 0xff),                                         // block type
+        damaged(zlibbed, zlibbed.size() - 1, 0x00),                         // Adler-32
+        damaged(zlibbed, zlibbed.size() / 2, static_cast<unsigned char>(~zlibbed[zlibbed.size() / 2])),
+    };
+    for (const Bytes& input : cases) {
+        clearLog();
+        IO::ByteArrayInputStream in(input.data(), static_cast<int>(input.size()));
+        IO::Zip::GzipInputStream unzipped(&in);
+        EXPECT_EQ(0, unzipped.available());
+        unsigned char byte;
+        EXPECT_EQ(-1, unzipped.read(&byte, 1));
+        EXPECT_TRUE(hasLogLine("GzipInputStream::read error -3"));
+        unzipped.enableExceptions();
+        EXPECT_THROW(unzipped.readInt(), IO::Exception);
+    }
+}
+
+TEST_F(GzipStreamTest, ContentBeyondTheLimitStopsWithAnErrorAndAnImplausibleTrailerIsNotTrusted) {
+    // One zero byte past the limit, deflated a MiB at a time.
+    const Bytes mebibyte(1 << 20, 0);
+    Bytes bomb(1 << 21);
+    z_stream zs = {};
+    deflateInit2(&zs, Z_BEST_SPEED, Z_DEFLATED, 31, 8, Z_DEFAULT_STRATEGY);
+    zs.next_out = bomb.data();
+    zs.avail_out = static_cast<uInt>(bomb.size());
+    for (int i = 0; i <= IO::Zip::GzipInputStream::kMaxInflatedSize >> 20; ++i) {
+        zs.next_in = const_cast<Bytef*>(mebibyte.data());
+        zs.avail_in = i < IO::Zip::GzipInputStream::kMaxInflatedSize >> 20 ? 1 << 20 : 1;
+        deflate(&zs, Z_NO_FLUSH);
+    }
+    deflate(&zs, Z_FINISH);
+    bomb.resize(zs.total_out);
+    deflateEnd(&zs);
+    EXPECT_EQ(Bytes(), gunzip(bomb));
+    EXPECT_TRUE(hasLogLine("GzipInputStream: content larger than 67108864 bytes"));
+
+    // Two members: the trailer at the end is the second's, shorter than the content read.
+    const Bytes first = pattern(5000, 1);
+    Bytes twoMembers = zlibGzip(first);
+    const Bytes second = zlibGzip(pattern(10, 2));
+    twoMembers.insert(twoMembers.end(), second.begin(), second.end());
+    EXPECT_EQ(first, gunzip(twoMembers));
 }
 
 TEST_F(GzipStreamTest, InflatesWhatTheInputHasLeftAndPassesExceptionsOnToTheContent) {

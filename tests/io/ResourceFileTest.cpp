@@ -1,12 +1,19 @@
 #include <boost/make_shared.hpp>
+#include <boost/weak_ptr.hpp>
+#include <cstdlib>
+#include <typeinfo>
 
 #include "IoTest.h"
 #include "io/ByteArrayInputStream.h"
 #include "io/ByteArrayOutputStream.h"
+#include "io/Exception.h"
+#include "io/FileInputStream.h"
+#include "io/WrappedInputStream.h"
 #include "io/resource/BlockInputStream.h"
 #include "io/resource/PackageBuilder.h"
 #include "io/resource/ResBlockInputStream.h"
 #include "io/resource/ResourceFile.h"
+#include "io/zip/GzipInputStream.h"
 #include "io/zip/ZipOutputStream.h"
 
 namespace {
@@ -28,7 +35,18 @@ public:
             return boost::shared_ptr<IO::InputStream>();
         }
         size_t size = std::min<size_t>(blockSize + extraBytes, data.size() - begin);
-        return boost::make_shared<IO::ByteArrayInputStream>(data.data() + begin, static_cast<int>(size));
+        boost::shared_ptr<IO::InputStream> block =
+            boost::make_shared<IO::ByteArrayInputStream>(data.data() + begin, static_cast<int>(size));
+        handedOut.push_back(block);
+        return block;
+    }
+
+    int stillOpen() const {
+        int count = 0;
+        for (const boost::weak_ptr<IO::InputStream>& block : handedOut) {
+            count += !block.expired();
+        }
+        return count;
     }
 
     BlockInputStream::BlockOpener opener() {
@@ -36,6 +54,7 @@ public:
     }
 
     std::vector<unsigned int> opened;
+    std::vector<boost::weak_ptr<IO::InputStream> > handedOut;
     int missing = -1;
     // Serves blocks longer than the block size, as a damaged package could.
     unsigned int extraBytes = 0;
@@ -117,12 +136,26 @@ TEST_F(BlockStreamTest, OpensOnlyTheBlocksAReadTouchesAndNothingOnASeek) {
     EXPECT_EQ(0, stream.available());
 }
 
+TEST_F(BlockStreamTest, ASequentialReadKeepsOnlyTheBlockItIsReading) {
+    Bytes chunk(150);
+    for (long long at = 0; at < 1000; at += 150) {
+        int length = static_cast<int>(std::min<long long>(150, 1000 - at));
+        EXPECT_EQ(length, stream.read(chunk.data(), length));
+        EXPECT_EQ(slice(thousand, at, length), slice(chunk, 0, length));
+        EXPECT_EQ(1, source.stillOpen()) << at;
+    }
+    EXPECT_EQ((std::vector<unsigned int>{0, 1, 2}), opened);
+}
+
 TEST_F(BlockStreamTest, ReadsAndSeeksPastTheEndStopThereWithoutTouchingAFurtherBlock) {
     stream.seek(-10, KD_SEEK_END);
-    Bytes buffer(50);
+    Bytes buffer(50, 0xff);
     EXPECT_EQ(10, stream.read(buffer.data(), 50));
     EXPECT_EQ(slice(thousand, 990, 10), slice(buffer, 0, 10));
+    EXPECT_EQ(Bytes(40, 0), slice(buffer, 10, 40));
+    expectAssertion("false");
     EXPECT_EQ(0, stream.read(buffer.data(), 50));
+    expectAssertion("false");
     EXPECT_EQ((std::vector<unsigned int>{2}), opened);
     stream.seek(-5, KD_SEEK_SET);
     EXPECT_EQ(0, stream.tell());
@@ -135,6 +168,7 @@ TEST_F(BlockStreamTest, AMissingBlockEndsTheReadShortAndALongOneLendsNoBytes) {
     Bytes all(1000);
     EXPECT_EQ(400, stream.read(all.data(), 1000));
     EXPECT_EQ(400, stream.tell());
+    expectAssertion("false");
 
     // A damaged package could serve blocks longer than the block size.
     BlockSource longBlocks(thousand, 400);
@@ -192,25 +226,105 @@ TEST_F(ResourceFileTest, AMissingResourceOrAnUnreadablePackageIsEmpty) {
     expectAssertion("false");
 }
 
-TEST_F(ResourceFileTest, ADamagedPackageWithAMissingPartEndsTheResourceShort) {
+TEST_F(ResourceFileTest, ASplitResourceWhosePartsDoNotHoldItsClaimDoesNotOpen) {
+    const std::string claims = "ResourceFile: X claims";
+    // 1000 bytes claimed, the last part missing: the design's assertion, and no stream.
     writeDamagedPackage({0xE8, 0x03, 0, 0, 0x90, 0x01, 0, 0}, false);
-    boost::shared_ptr<IO::InputStream> stream = openResource("X", index());
-    ASSERT_TRUE(stream);
-    Bytes all(1000);
-    EXPECT_EQ(800, stream->read(all.data(), 1000));
-    EXPECT_EQ(slice(thousand, 0, 800), slice(all, 0, 800));
-    expectAssertion("entry");
-}
-
-TEST_F(ResourceFileTest, ADamagedPackageWithAWrongSizedExtraFieldOrABlockSizeOfZeroIsRefused) {
-    writeDamagedPackage({0xE8, 0x03, 0}, true);
     EXPECT_FALSE(openResource("X", index()));
-    expectAssertion("entry->extra.size() == sizeof(ExtraField)");
+    expectAssertion("entry");
+    EXPECT_EQ(1, countLogLines(claims));
+
+    // 4 GiB in blocks of one byte, and 2 GiB in blocks of 16: nothing is sized from the claim.
+    for (const Bytes& extra :
+         {Bytes{0xff, 0xff, 0xff, 0xff, 1, 0, 0, 0}, Bytes{0, 0, 0, 0x80, 16, 0, 0, 0}}) {
+        package = boost::make_shared<IO::ByteArrayOutputStream>();
+        writeDamagedPackage(extra, true);
+        clearLog();
+        EXPECT_FALSE(openResource("X", index()));
+        EXPECT_EQ(1, countLogLines(claims));
+    }
+
+    // Every part there, but one shorter or longer than the claim says.
+    for (const Bytes& extra :
+         {Bytes{0xE7, 0x03, 0, 0, 0x90, 0x01, 0, 0}, Bytes{0xE8, 0x03, 0, 0, 0x91, 0x01, 0, 0}}) {
+        package = boost::make_shared<IO::ByteArrayOutputStream>();
+        writeDamagedPackage(extra, true);
+        clearLog();
+        EXPECT_FALSE(openResource("X", index()));
+        EXPECT_EQ(1, countLogLines(claims));
+    }
 
     package = boost::make_shared<IO::ByteArrayOutputStream>();
     writeDamagedPackage({0xE8, 0x03, 0, 0, 0, 0, 0, 0}, true);
     EXPECT_FALSE(openResource("X", index()));
-    expectAssertion("extra.blockSize > 0");
+    expectAssertion("blockSize > 0");
+}
+
+TEST_F(ResourceFileTest, AnEntryWithAnotherToolsExtraFieldIsOneWholeResource) {
+    writeDamagedPackage({0x55, 0x54, 0x05, 0x00, 0x03, 0x10, 0x20, 0x30, 0x40}, true);
+    boost::shared_ptr<IO::Resource::FileSystem> packed = index();
+    EXPECT_EQ(1, countLogLines("Resource package: 1 entries carry extra fields of other tools"));
+    boost::shared_ptr<IO::InputStream> stream = openResource("X", packed);
+    ASSERT_TRUE(stream);
+    EXPECT_EQ(slice(thousand, 0, 400), readAll(*stream));
+}
+
+TEST_F(ResourceFileTest, APackageMadeByTheZipCommandReadsBack) {
+    // Info-ZIP adds a timestamp and an owner field to every entry.
+    const Bytes big = pattern(70000, 21);
+    const Bytes text = bytesOf("plain text resource\n");
+    writeFile("/in/maps/big.bin", big);
+    writeFile("/in/text.txt", text);
+    const std::string command = "cd '" + hostPath("/in") + "' && zip -q -r ../pkg.zip maps text.txt";
+    ASSERT_EQ(0, std::system(command.c_str()));
+    boost::shared_ptr<IO::FileInputStream> file = boost::make_shared<IO::FileInputStream>();
+    ASSERT_TRUE(file->init("/pkg.zip"));
+    boost::shared_ptr<IO::Resource::FileSystem> packed = ResourceFile::createFileSystem(file);
+    ASSERT_TRUE(packed);
+    EXPECT_EQ(1, countLogLines("entries carry extra fields of other tools"));
+    for (auto expected : {std::make_pair("maps/big.bin", big), std::make_pair("text.txt", text)}) {
+        boost::shared_ptr<IO::FileInputStream> again = boost::make_shared<IO::FileInputStream>();
+        ASSERT_TRUE(again->init("/pkg.zip"));
+        boost::shared_ptr<IO::InputStream> stream =
+            boost::make_shared<ResourceFile>(again)->openInputStream(expected.first, packed);
+        ASSERT_TRUE(stream) << expected.first;
+        EXPECT_EQ(expected.second, readAll(*stream)) << expected.first;
+    }
+}
+
+TEST_F(ResourceFileTest, EveryStreamKindThrowsOnAReadPastItsEndOnceExceptionsAreEnabled) {
+    const Bytes small = pattern(100, 5);
+    {
+        PackageBuilder builder(package, 400);
+        builder.addResource("stored", small.data(), small.size(), false);
+        builder.addResource("deflated", small.data(), small.size(), true);
+        builder.addResource("X", thousand.data(), thousand.size(), false);
+    }
+    writeFile("/data/f", small);
+    boost::shared_ptr<IO::FileInputStream> file = boost::make_shared<IO::FileInputStream>();
+    ASSERT_TRUE(file->init("/data/f"));
+    boost::shared_ptr<IO::Zip::ZipFile> zip = boost::make_shared<IO::Zip::ZipFile>();
+    ASSERT_TRUE(zip->init(packageStream(), nullptr));
+    boost::shared_ptr<IO::Zip::ZipFile> inflating = boost::make_shared<IO::Zip::ZipFile>();
+    ASSERT_TRUE(inflating->init(packageStream(), nullptr));
+    const Bytes garbage = bytesOf("\x1f\x8b damaged");
+    IO::ByteArrayInputStream garbageStream(garbage.data(), static_cast<int>(garbage.size()));
+    const boost::shared_ptr<IO::InputStream> streams[] = {
+        boost::make_shared<IO::ByteArrayInputStream>(small.data(), static_cast<int>(small.size())),
+        file,
+        boost::make_shared<IO::WrappedInputStream>(packageStream(), 10, 20),
+        zip->getInputStream(*zip->findEntry("stored"), true),
+        zip->getInputStream(*zip->findEntry("deflated"), true),
+        inflating->getInputStream(*inflating->findEntry("deflated"), false),
+        openResource("X", index()),
+        boost::make_shared<IO::Zip::GzipInputStream>(&garbageStream),
+    };
+    for (const boost::shared_ptr<IO::InputStream>& stream : streams) {
+        ASSERT_TRUE(stream);
+        stream->enableExceptions();
+        readAll(*stream);
+        EXPECT_THROW(stream->readInt(), IO::Exception) << typeid(*stream).name();
+    }
 }
 
 TEST_F(ResourceFileTest, TheBuilderRefusesNamesThatWouldCollide) {

@@ -1,3 +1,4 @@
+#include <algorithm>
 #include <boost/make_shared.hpp>
 
 #include "IoTest.h"
@@ -124,6 +125,7 @@ TEST_F(ZipFileTest, AnUncachedStreamInflatesWhileReadingAndOwnsTheArchiveMeanwhi
 
         EXPECT_EQ(slice(binary, 10, binary.size() - 10), readAll(*stream));
         EXPECT_EQ(Bytes(), readSome(*stream, 1));
+        expectAssertion("false");
     }
     EXPECT_EQ(text, entryBytes(*zip, "a.txt", true));
 }
@@ -175,15 +177,66 @@ TEST_F(ZipFileTest, TheCentralExtraFieldIsKeptAsWritten) {
     EXPECT_EQ(text, entryBytes(*zip, "z", true));
 }
 
-TEST_F(ZipFileTest, LongNamesAreIndexedWholeButOnlyStoredOnesOpen) {
+TEST_F(ZipFileTest, LongNamesAreIndexedWholeAndOpen) {
+    // minizip cannot search for a name of 256 bytes or more; entries are not searched for.
     const std::string name(300, 'n');
     zip = open(archive({{name, text, false, {}}, {name + "x", binary, true, {}}}));
     ASSERT_TRUE(zip);
     EXPECT_EQ(text, entryBytes(*zip, name, true));
-    // minizip cannot locate a compressed entry by a name of 256 bytes or more.
-    ASSERT_TRUE(zip->findEntry(name + "x"));
-    EXPECT_EQ(Bytes(), entryBytes(*zip, name + "x", true));
+    EXPECT_EQ(binary, entryBytes(*zip, name + "x", true));
+}
+
+TEST_F(ZipFileTest, IndexingReadsOnlyTheDirectorySoADamagedLocalHeaderSpoilsOnlyItsEntry) {
+    Bytes bytes = textAndBinary();
+    const Bytes local = {0x50, 0x4b, 0x03, 0x04};
+    auto second = std::search(std::search(bytes.begin(), bytes.end(), local.begin(), local.end()) + 4,
+                              bytes.end(), local.begin(), local.end());
+    second[0] = 'X';
+    zip = open(bytes);
+    ASSERT_TRUE(zip);
+    EXPECT_EQ(text, entryBytes(*zip, "a.txt", true));
+    EXPECT_FALSE(entryStream(*zip, "b.bin", true));
     expectAssertion("false");
+}
+
+TEST_F(ZipFileTest, SizesThatTheArchiveCannotHoldAreRefusedBeforeAnythingIsSizedFromThem) {
+    // Patches the sizes of the entry at index in its local header and its directory record alike
+    // (minizip itself refuses the two when they disagree).
+    auto lying = [this](size_t index, unsigned int compressedSize, unsigned int uncompressedSize) {
+        Bytes bytes = textAndBinary();
+        for (const auto& record : {std::make_pair(Bytes{0x50, 0x4b, 0x03, 0x04}, 18),
+                                   std::make_pair(Bytes{0x50, 0x4b, 0x01, 0x02}, 20)}) {
+            auto at = bytes.begin() - 4;
+            for (size_t i = 0; i <= index; ++i) {
+                at = std::search(at + 4, bytes.end(), record.first.begin(), record.first.end());
+            }
+            for (int i = 0; i < 4; ++i) {
+                at[record.second + i] = static_cast<unsigned char>(compressedSize >> (8 * i));
+                at[record.second + 4 + i] = static_cast<unsigned char>(uncompressedSize >> (8 * i));
+            }
+        }
+        return bytes;
+    };
+    const unsigned int deflated = zip->findEntry("b.bin")->compressedSize;
+    const struct {
+        Bytes archive;
+        const char* name;
+    } cases[] = {
+        {lying(1, deflated, 0x7fffffff), "b.bin"},
+        {lying(1, 0x7fffff00, 0x7fffffff), "b.bin"},
+        {lying(0, 0x100000, 0x100000), "a.txt"},
+        {lying(0, static_cast<unsigned int>(text.size()), 1), "a.txt"},
+    };
+    for (const auto& item : cases) {
+        clearLog();
+        boost::shared_ptr<ZipFile> damaged = open(item.archive);
+        ASSERT_TRUE(damaged);
+        for (bool cached : {true, false}) {
+            EXPECT_FALSE(entryStream(*damaged, item.name, cached)) << item.name;
+            expectAssertion("false");
+        }
+        EXPECT_EQ(2, countLogLines(std::string("ZipFile: entry ") + item.name + " claims more data"));
+    }
 }
 
 TEST_F(ZipFileTest, EmptyAndRepeatedEntriesWorkAndAnArchiveWithoutEntriesIsRefused) {

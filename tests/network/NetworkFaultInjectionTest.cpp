@@ -74,7 +74,7 @@ private:
 
 class NetworkFaultInjectionTest : public NetworkTest {};
 
-// Tasks against resets, bursts of 5xx, slow answers, garbage, refused
+// Tasks against resets, cut bodies, bursts of 5xx, slow answers, garbage, refused
 // connections and a missing path while reachability flaps, offline mode
 // comes and goes and tasks are cancelled at random moments (fixed seed). The
 // checks hold for any timing of the real exchanges.
@@ -84,6 +84,9 @@ TEST_F(NetworkFaultInjectionTest, EveryTaskEndsExactlyOnceAndCancelledTasksStayS
     auto pick = [&](int range) { return static_cast<int>(random() % range); };
 
     RawReplyServer garbage("HTTP/1.1 2x0 Garbled\r\n\r\n\x01\x02");
+    RawReplyServer::Options resetting;
+    resetting.reset = true;
+    RawReplyServer reset("HTTP/1.1 200 OK\r\nContent-Length: 100\r\n\r\ncut short", resetting);
     Reply slow;
     slow.body = "slow";
     slow.delayMs = 300;
@@ -94,6 +97,7 @@ TEST_F(NetworkFaultInjectionTest, EveryTaskEndsExactlyOnceAndCancelledTasksStayS
                                      serve("/reset", 200, std::string(40000, 'r'), Reply::DropMidBody),
                                      server->url("/slow"),
                                      garbage.url(),
+                                     reset.url(),
                                      refusedUrl(),
                                      serve("/missing", 404)};
 

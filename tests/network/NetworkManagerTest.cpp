@@ -1,4 +1,6 @@
+#include <atomic>
 #include <mutex>
+#include <thread>
 
 #include "NetworkTest.h"
 
@@ -453,4 +455,42 @@ TEST_F(NetworkManagerTest, ShutdownDropsTasksWhereverTheyAreWithoutCallbacks) {
     EXPECT_EQ((std::vector<std::string>{"request", "response 503"}), waitingForNetwork->log);
     EXPECT_TRUE(unready->log.empty());
     EXPECT_EQ(0, pal::reachabilityListeners());
+}
+
+// A task submitted on another thread runs there, also when the main thread's
+// completion releases it from the unready queue: the start is posted to it.
+TEST_F(NetworkManagerTest, TaskOfAnotherThreadRunsAndReportsOnThatThread) {
+    struct Worker {
+        static void* run(void* argument) {
+            Worker* worker = static_cast<Worker*>(argument);
+            worker->thread = kdThreadSelf();
+            worker->task->onFinish = [worker] { worker->finishThread = kdThreadSelf(); };
+            NetworkManager::getInstance()->submit(worker->task, policy(1000, 0));
+            worker->submitted = true;
+            while (!worker->task->finished()) {
+                kdWaitEvent(static_cast<KDust>(-1));
+            }
+            return nullptr;
+        }
+        Task task;
+        std::atomic<bool> submitted{false};
+        KDThread* thread = nullptr;
+        KDThread* finishThread = nullptr;
+    } worker;
+    std::string url = serve("/elsewhere", 200, "far");
+    worker.task = makeTask(url);
+    worker.task->ready = false;
+    KDThread* thread = kdThreadCreate(nullptr, &Worker::run, &worker);
+    while (!worker.submitted) {
+        std::this_thread::yield();
+    }
+    EXPECT_EQ(1, manager->getUnreadyCount());
+    worker.task->ready = true;
+    Task local = makeTask(url);
+    manager->submit(local);
+    EXPECT_TRUE(settle([&] { return local->finished(); }));
+    kdThreadJoin(thread, nullptr);
+    EXPECT_EQ("far", worker.task->body);
+    EXPECT_EQ(worker.thread, worker.finishThread);
+    EXPECT_EQ(0, manager->getTaskCount());
 }

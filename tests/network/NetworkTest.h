@@ -1,21 +1,15 @@
 #pragma once
 
 #include <KD/kdext.h>
-#include <arpa/inet.h>
-#include <netinet/in.h>
 #include <pal/Simulation.h>
-#include <poll.h>
-#include <sys/socket.h>
-#include <unistd.h>
 
-#include <atomic>
 #include <boost/make_shared.hpp>
 #include <functional>
 #include <memory>
 #include <string>
-#include <thread>
 #include <vector>
 
+#include "http/RawReplyServer.h"
 #include "network/NetworkErrorCodes.h"
 #include "network/NetworkManager.h"
 #include "network/NetworkTaskBasicRetryPolicy.h"
@@ -26,55 +20,6 @@
 #include "support/TestHttpServer.h"
 
 using Network::NetworkManager;
-
-// A loopback peer that reads a request head, answers with fixed raw bytes
-// (possibly none) and closes: answers no HTTP server library would give.
-class RawReplyServer {
-public:
-    explicit RawReplyServer(const std::string& answer) : answer(answer) {
-        sockaddr_in address{};
-        address.sin_family = AF_INET;
-        address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-        socklen_t length = sizeof(address);
-        ::bind(listener, reinterpret_cast<sockaddr*>(&address), sizeof(address));
-        ::listen(listener, 16);
-        ::getsockname(listener, reinterpret_cast<sockaddr*>(&address), &length);
-        port = ntohs(address.sin_port);
-        thread = std::thread([this] { serve(); });
-    }
-    ~RawReplyServer() {
-        stopping = true;
-        thread.join();
-        ::close(listener);
-    }
-    std::string url() const { return "http://127.0.0.1:" + std::to_string(port) + "/raw"; }
-
-private:
-    void serve() {
-        while (!stopping) {
-            pollfd waiting = {listener, POLLIN, 0};
-            int client = ::poll(&waiting, 1, 20) > 0 ? ::accept(listener, nullptr, nullptr) : -1;
-            if (client < 0) {
-                continue;
-            }
-            std::string head;
-            char buffer[1024];
-            ssize_t count = 1;
-            while (count > 0 && head.find("\r\n\r\n") == std::string::npos) {
-                count = ::recv(client, buffer, sizeof(buffer), 0);
-                head.append(buffer, count > 0 ? static_cast<std::size_t>(count) : 0);
-            }
-            ::send(client, answer.data(), answer.size(), MSG_NOSIGNAL);
-            ::close(client);
-        }
-    }
-
-    std::string answer;
-    int listener = ::socket(AF_INET, SOCK_STREAM, 0);
-    int port = 0;
-    std::atomic<bool> stopping{false};
-    std::thread thread;
-};
 
 // A client task that writes what the manager does to it into a log, its own
 // or one shared by several tasks (entries then carry the task's name).

@@ -76,6 +76,51 @@ TEST_F(XmlUtilsTest, BrokenOrEmptyDocumentsFail) {
     EXPECT_FALSE(XmlUtils::load(truncated, true, doc));
 }
 
+std::string repeat(const std::string& text, int times) {
+    std::string all;
+    for (int i = 0; i < times; ++i) {
+        all += text;
+    }
+    return all;
+}
+
+std::string nested(int depth, const std::string& open = "<a>") {
+    return repeat(open, depth) + repeat("</a>", depth);
+}
+
+TEST_F(XmlUtilsTest, DocumentsNestedDeeperThanTheLimitAreRefusedBeforeTheParserSeesThem) {
+    const int limit = XmlUtils::kMaxDepth;
+    // Closes that TinyXML does not read as closes must not hide depth: in a comment, in CDATA,
+    // in attribute values, in a declaration.
+    const std::string hidden = repeat("</a>", 100);
+    const std::string refused[] = {
+        nested(limit + 1),
+        nested(50000),
+        nested(limit + 1, "<a x='/>' y=\"</a>\">"),
+        repeat("<a>", 200) + "<!-- " + hidden + " -->" + repeat("<a>", 100),
+        repeat("<a>", 200) + "<![CDATA[" + hidden + "]]>" + repeat("<a>", 100),
+        repeat("<a attr = \"" + hidden + "\">", 300),
+        "<r>" + repeat("<a>", 200) + "<?xml version=\"" + hidden + "\"?>" + repeat("<a>", 100),
+        "<r>" + repeat("<a>", 200) + "<?xml foo='a version=\"b'?>" + hidden + "\">" + repeat("<a>", 100),
+        repeat("<\xc3\xa9>", limit + 1),
+    };
+    for (const std::string& text : refused) {
+        clearLog();
+        EXPECT_FALSE(XmlUtils::load(bytesOf(text), false, doc)) << text.substr(0, 80);
+        EXPECT_TRUE(hasLogLine("XmlUtils::load()[document nested deeper than 256 levels]"));
+        EXPECT_EQ(nullptr, doc.RootElement());
+    }
+
+    const std::string accepted[] = {
+        nested(limit),
+        "<?xml version=\"1.0\" encoding='UTF-8' ?><!DOCTYPE r><r>" + repeat("<a x=\"1\"/><b>t</b>", 2000) +
+            "<!-- <a><a> -->" + nested(limit - 1, "<a y='>'>") + "</r>",
+    };
+    for (const std::string& text : accepted) {
+        EXPECT_TRUE(XmlUtils::load(bytesOf(text), false, doc)) << text.substr(0, 80);
+    }
+}
+
 TEST_F(XmlUtilsTest, TextAndAttributeGettersFallBackForMissingOrUnreadableValues) {
     const TiXmlElement* root =
         parse("<r s=\"v\" i=\"-12\" f=\"2.5\" bad=\"x\"><n> 42x</n><f>-2.5e1</f><empty/><s>text</s></r>");

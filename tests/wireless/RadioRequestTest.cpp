@@ -134,50 +134,38 @@ TEST_F(RadioRequestTest, RestartOrCancelSilencesTheEarlierQuery) {
         0, pal::pendingWifiScans() + pal::pendingCellInfoRequests() + pal::pendingSignalStrengthRequests());
 }
 
-TEST_F(RadioRequestTest, CellAnswersCopyTheCellOrGiveAnInvalidRecord) {
+TEST_F(RadioRequestTest, TelephonyAnswersAndRefusalsEachReportOnce) {
     const std::string operatorCode(16, '7');
     const std::string countryCode(18, '4');
-    pal::scriptCellInfo(pal::Answer::after(0), {true, 123456, 4321, operatorCode, countryCode});
-    TelephonyNetworkInfoRequest request;
-    request.start(receiver.cell());
-    pump();
-    pal::scriptCellInfo(pal::Answer::after(0), {false, 9, 9, "26201", "262"});
-    request.start(receiver.cell());
-    pump();
-    pal::scriptCellInfo(pal::Answer::refuse(), {true, 9, 9, "26201", "262"});
-    request.start(receiver.cell());
-    pump();
+    const struct {
+        pal::Answer answer;
+        bool known;
+    } rounds[] = {
+        {pal::Answer::after(0), true}, {pal::Answer::after(0), false}, {pal::Answer::refuse(), true}};
+    TelephonyNetworkInfoRequest cell;
+    TelephonySignalStrengthRequest strength;
+    for (const auto& round : rounds) {
+        pal::scriptCellInfo(round.answer, {round.known, 123456, 4321, operatorCode, countryCode});
+        pal::scriptSignalStrength(round.answer, round.known, -73);
+        cell.start(receiver.cell());
+        strength.start(receiver.strength());
+        pump();
+    }
 
     ASSERT_EQ(3u, receiver.cells.size());
+    ASSERT_EQ(3u, receiver.strengths.size());
     const TelephonyNetworkInfo& known = *receiver.cells[0];
     EXPECT_TRUE(known.isValid());
     EXPECT_EQ(123456, known.getCellID());
     EXPECT_EQ(4321, known.getLocationAreaCode());
     EXPECT_EQ(operatorCode, known.getOperatorId());
     EXPECT_EQ(countryCode, known.getCountryCode());
+    EXPECT_EQ(std::make_pair(true, -73), receiver.strengths[0]);
     for (int i = 1; i < 3; ++i) {
         EXPECT_FALSE(receiver.cells[i]->isValid()) << i;
-        EXPECT_EQ("", receiver.cells[i]->getOperatorId()) << i;
-        EXPECT_EQ("", receiver.cells[i]->getCountryCode()) << i;
+        EXPECT_EQ("", receiver.cells[i]->getOperatorId() + receiver.cells[i]->getCountryCode()) << i;
+        EXPECT_FALSE(receiver.strengths[i].first) << i;
     }
-}
-
-TEST_F(RadioRequestTest, SignalStrengthReportsTheFlagAndARefusalAsFailure) {
-    TelephonySignalStrengthRequest request;
-    pal::scriptSignalStrength(pal::Answer::after(0), true, -73);
-    request.start(receiver.strength());
-    pump();
-    pal::scriptSignalStrength(pal::Answer::after(0), false, -73);
-    request.start(receiver.strength());
-    pump();
-    pal::scriptSignalStrength(pal::Answer::refuse(), true, -73);
-    request.start(receiver.strength());
-    pump();
-
-    ASSERT_EQ(3u, receiver.strengths.size());
-    EXPECT_EQ(std::make_pair(true, -73), receiver.strengths[0]);
-    EXPECT_FALSE(receiver.strengths[1].first);
-    EXPECT_EQ(std::make_pair(false, 0), receiver.strengths[2]);
 }
 
 }  // namespace

@@ -1,7 +1,7 @@
 #include "io/resource/BlockInputStream.h"
 
 #include <algorithm>
-#include <climits>
+#include <cstring>
 
 namespace IO {
 namespace Resource {
@@ -9,9 +9,6 @@ namespace Resource {
 BlockInputStream::BlockInputStream(BlockOpener openBlock, unsigned int totalSize, unsigned int blockSize)
     : openBlock(openBlock), totalSize(totalSize), blockSize(blockSize) {
     KD_ASSERT(blockSize > 0);
-    if (blockSize > 0 && totalSize > 0) {
-        blocks.resize((totalSize - 1) / blockSize + 1);
-    }
 }
 
 long long BlockInputStream::available() {
@@ -19,46 +16,53 @@ long long BlockInputStream::available() {
 }
 
 int BlockInputStream::read(void* buffer, int length) {
-    if (length < 1 || blocks.empty()) {
+    if (length < 1) {
         return 0;
     }
-    unsigned int remaining = static_cast<unsigned int>(std::min<long long>(length, available()));
+    unsigned int wanted = static_cast<unsigned int>(std::min<long long>(length, available()));
     unsigned char* out = static_cast<unsigned char*>(buffer);
     unsigned int total = 0;
-    while (total < remaining) {
-        int count = readFromBlock(out + total, remaining - total);
+    while (total < wanted) {
+        int count = readFromBlock(out + total, wanted - total);
         if (count <= 0) {
             break;
         }
         position += count;
         total += count;
     }
+    if (total < static_cast<unsigned int>(length)) {
+        // Past the end, or a block that cannot be read: the rest of the buffer is zero.
+        std::memset(out + total, 0, length - total);
+        handleBadState();
+    }
     return static_cast<int>(total);
 }
 
 int BlockInputStream::readFromBlock(unsigned char* buffer, unsigned int length) {
+    if (blockSize == 0) {
+        return 0;
+    }
     unsigned int index = position / blockSize;
     unsigned int offset = position % blockSize;
-    boost::shared_ptr<InputStream>& block = blocks[index];
-    if (!block) {
-        block = openBlock(index);
-        if (!block) {
+    // Only the block being read stays open: a sequential read of a large resource holds one
+    // block, not every block it passed.
+    if (!current || currentIndex != index) {
+        current.reset();
+        current = openBlock(index);
+        currentIndex = index;
+        if (!current) {
             return 0;
         }
     }
-    block->seek(offset, KD_SEEK_SET);
-    long long blockAvailable = block->available();
-    KD_ASSERT(blockAvailable <= INT_MAX);
+    current->seek(offset, KD_SEEK_SET);
     // A block longer than the block size must not lend its extra bytes to the next block's
     // positions.
-    long long n = std::min<long long>({blockAvailable, static_cast<long long>(blockSize - offset), length});
-    KD_ASSERT(n > 0);
+    long long n =
+        std::min<long long>({current->available(), static_cast<long long>(blockSize - offset), length});
     if (n <= 0) {
         return 0;
     }
-    int count = block->read(buffer, static_cast<int>(n));
-    KD_ASSERT(count == n);
-    return count;
+    return current->read(buffer, static_cast<int>(n));
 }
 
 long long BlockInputStream::tell() {

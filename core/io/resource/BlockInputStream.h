@@ -1,7 +1,6 @@
 #pragma once
 
 #include <boost/shared_ptr.hpp>
-#include <vector>
 
 #include "io/InputStream.h"
 #include "util/callback.h"
@@ -10,8 +9,8 @@ namespace IO {
 namespace Resource {
 
 // Reads a resource split into blocks of blockSize bytes (the last holds the rest) as one
-// stream. A block is opened, through openBlock, only when first read and kept open afterwards.
-// Not thread-safe: one thread uses the stream.
+// stream. A block is opened, through openBlock, only when read, and only the block last read
+// stays open. Not thread-safe: one thread uses the stream.
 class BlockInputStream : public InputStream {
 public:
     typedef callback<boost::shared_ptr<InputStream> (*)(unsigned int)> BlockOpener;
@@ -19,8 +18,9 @@ public:
     BlockInputStream(BlockOpener openBlock, unsigned int totalSize, unsigned int blockSize);
 
     long long available() override;
-    // Crosses block boundaries. Asking for more than is left is a caller error: only what is
-    // left is delivered, and no block past the last is touched.
+    // Crosses block boundaries. Asking for more than is left, or a block that cannot be read, is
+    // a bad state (an exception once exceptions are enabled): what could be read is delivered,
+    // the rest of the buffer is zero, and no block past the last is touched.
     int read(void* buffer, int length) override;
     long long tell() override;
     // Opens nothing; positions outside the resource are clamped to its ends.
@@ -30,7 +30,8 @@ private:
     // Reads from the block that holds position, opening it when needed; 0 when it fails.
     int readFromBlock(unsigned char* buffer, unsigned int length);
 
-    std::vector<boost::shared_ptr<InputStream> > blocks;
+    boost::shared_ptr<InputStream> current;
+    unsigned int currentIndex = 0;
     unsigned int position = 0;
     BlockOpener openBlock;
     unsigned int totalSize;

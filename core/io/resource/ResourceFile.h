@@ -24,13 +24,17 @@ public:
     explicit ResourceFile(boost::shared_ptr<InputStream> package);
 
     // Opens the resource with the given name, at most once per ResourceFile. With an empty
-    // fileSystem the package is indexed for this call. Empty when the resource is missing.
+    // fileSystem the package is indexed for this call. Empty when the resource is missing, or
+    // when it is split and its parts do not hold the sizes its extra field claims.
     boost::shared_ptr<InputStream> openInputStream(const std::string& name,
                                                    boost::shared_ptr<FileSystem> fileSystem);
     // The stream of block index of the opened resource; empty when that part is missing.
     boost::shared_ptr<InputStream> openEntryStream(unsigned int index);
 
 private:
+    bool partsHold(const Zip::ZipEntry& first, unsigned int totalSize, unsigned int blockSize) const;
+    std::string partName(unsigned int index) const;
+
     boost::shared_ptr<InputStream> stream;
     std::string name;
     boost::shared_ptr<Zip::ZipFile> file;

@@ -9,6 +9,79 @@
 namespace IO {
 namespace Zip {
 
+namespace {
+
+// Deflate's densest form carries about 1032 output bytes per input byte, so a gzip trailer that
+// claims more than that describes data the input does not hold.
+const unsigned long long kMaxDeflateRatio = 1032;
+const size_t kCountingChunk = 64 * 1024;
+// Not a zlib code: the content is larger than kMaxInflatedSize.
+const int kTooLarge = -100;
+
+// A lone first byte of the gzip magic is a gzip stream cut short, not plain content.
+bool hasGzipHeader(const std::vector<unsigned char>& input) {
+    return !input.empty() && input[0] == 0x1f && (input.size() == 1 || input[1] == 0x8b);
+}
+
+// Deflate method, a window of at most 32 KiB and the header check of RFC 1950.
+bool hasZlibHeader(const std::vector<unsigned char>& input) {
+    return input.size() >= 2 && (input[0] & 0x0f) == 8 && (input[0] >> 4) <= 7 &&
+           ((input[0] << 8) | input[1]) % 31 == 0;
+}
+
+// The content size a gzip trailer states, when it is one the input could hold.
+bool gzipSizeHint(const std::vector<unsigned char>& input, size_t& size) {
+    if (input.size() < 18 || !hasGzipHeader(input)) {
+        return false;
+    }
+    const unsigned char* trailer = &input[input.size() - 4];
+    unsigned long long claimed = trailer[0] | (trailer[1] << 8) | (trailer[2] << 16) |
+                                 (static_cast<unsigned long long>(trailer[3]) << 24);
+    if (claimed > static_cast<unsigned long long>(GzipInputStream::kMaxInflatedSize) ||
+        claimed > kMaxDeflateRatio * input.size()) {
+        return false;
+    }
+    size = static_cast<size_t>(claimed);
+    return true;
+}
+
+// Inflates input into out (room bytes), or, with out null, counts the output and drops it.
+// Stops at the end of the stream, at an error, when out is full, or past kMaxInflatedSize.
+int inflateInto(const std::vector<unsigned char>& input, unsigned char* out, size_t room, size_t& produced) {
+    produced = 0;
+    z_stream zs = {};
+    zs.next_in = const_cast<Bytef*>(input.data());
+    zs.avail_in = static_cast<uInt>(input.size());
+    // 15 window bits plus 32: the zlib or gzip header is recognised by itself.
+    int result = inflateInit2(&zs, 47);
+    if (result != Z_OK) {
+        return result;
+    }
+    std::vector<unsigned char> chunk(out ? 0 : kCountingChunk);
+    // zlib refuses a null output pointer even with no room behind it.
+    unsigned char noRoom;
+    while (result == Z_OK) {
+        if (out) {
+            zs.next_out = room > 0 ? out + zs.total_out : &noRoom;
+            zs.avail_out = static_cast<uInt>(room - zs.total_out);
+        } else {
+            zs.next_out = chunk.data();
+            zs.avail_out = static_cast<uInt>(chunk.size());
+        }
+        result = inflate(&zs, Z_NO_FLUSH);
+        if (zs.total_out > static_cast<uLong>(GzipInputStream::kMaxInflatedSize)) {
+            result = kTooLarge;
+        } else if (out && result == Z_OK && zs.total_out == room) {
+            break;
+        }
+    }
+    produced = zs.total_out;
+    inflateEnd(&zs);
+    return result;
+}
+
+}  // namespace
+
 GzipInputStream::GzipInputStream(InputStream* compressed) {
     KD_ASSERT(compressed);
     if (!compressed) {
@@ -18,52 +91,55 @@ GzipInputStream::GzipInputStream(InputStream* compressed) {
     int size = left <= 0 ? 0 : (left > INT_MAX ? INT_MAX : static_cast<int>(left));
     std::vector<unsigned char> input(size);
     if (size > 0 && compressed->read(input.data(), size) != size) {
+        Logger::log(Logger::Error, "GzipInputStream: could not read the compressed input");
         return;
     }
-    if (inflateAll(input)) {
-        inner.reset(new ByteArrayInputStream(data.data(), static_cast<int>(data.size())));
+    if (!input.empty() && !hasGzipHeader(input) && !hasZlibHeader(input)) {
+        // Not compressed data: the bytes are the content as they are.
+        data.swap(input);
+    } else if (!inflateAll(input)) {
+        return;
     }
+    inner.reset(new ByteArrayInputStream(data.data(), static_cast<int>(data.size())));
 }
 
 bool GzipInputStream::inflateAll(const std::vector<unsigned char>& input) {
-    z_stream zs = {};
-    zs.next_in = const_cast<Bytef*>(input.data());
-    zs.avail_in = static_cast<uInt>(input.size());
-    // 15 window bits plus 32: the zlib or gzip header is recognised by itself.
-    if (inflateInit2(&zs, 47) != Z_OK) {
-        return false;
-    }
-    const size_t step = 2 * input.size();
-    // zlib refuses a null output pointer even with no room behind it; empty input must reach
-    // inflate and be reported as having nothing to inflate.
-    unsigned char noRoom;
+    // The content is sized before it is held, so that memory peaks at the content itself, never
+    // at a grown copy of it: from the gzip trailer when it is plausible, else by inflating once
+    // just to count.
+    size_t size = 0;
+    size_t produced = 0;
     int result = Z_OK;
-    while (result == Z_OK) {
-        if (zs.total_out == data.size()) {
-            // The content is read through an int-sized memory stream.
-            if (data.size() + step > static_cast<size_t>(INT_MAX)) {
-                result = Z_MEM_ERROR;
-                break;
-            }
-            data.resize(data.size() + step);
+    if (gzipSizeHint(input, size)) {
+        data.resize(size + 1);
+        result = inflateInto(input, data.data(), data.size(), produced);
+        if (result == Z_STREAM_END) {
+            data.resize(produced);
+            return true;
         }
-        zs.next_out = data.empty() ? &noRoom : data.data() + zs.total_out;
-        zs.avail_out = static_cast<uInt>(data.size() - zs.total_out);
-        result = inflate(&zs, Z_NO_FLUSH);
+        // A full buffer means more content than the trailer says (several members): count it.
+        if (produced < data.size()) {
+            return fail(result);
+        }
     }
-    bool ok = true;
-    if (result == Z_STREAM_END) {
-        data.resize(zs.total_out);
-    } else if (result == Z_DATA_ERROR) {
-        // Not compressed data: the bytes are the content as they are.
-        data = input;
+    result = inflateInto(input, nullptr, 0, size);
+    if (result != Z_STREAM_END) {
+        return fail(result);
+    }
+    std::vector<unsigned char>().swap(data);
+    data.resize(size);
+    result = inflateInto(input, data.data(), data.size(), produced);
+    return result == Z_STREAM_END && produced == size ? true : fail(result);
+}
+
+bool GzipInputStream::fail(int result) {
+    if (result == kTooLarge) {
+        Logger::log(Logger::Error, "GzipInputStream: content larger than %d bytes", kMaxInflatedSize);
     } else {
         Logger::log(Logger::Error, "GzipInputStream::read error %d", result);
-        data.clear();
-        ok = false;
     }
-    inflateEnd(&zs);
-    return ok;
+    std::vector<unsigned char>().swap(data);
+    return false;
 }
 
 void GzipInputStream::enableExceptions() {
@@ -78,7 +154,15 @@ long long GzipInputStream::available() {
 }
 
 int GzipInputStream::read(void* buffer, int length) {
-    return inner ? inner->read(buffer, length) : -1;
+    if (inner) {
+        return inner->read(buffer, length);
+    }
+    // Damaged data has no content: reading it is a bad state where the reader asked for
+    // exceptions, and an answer of -1 elsewhere (never an assertion: the data is not ours).
+    if (exceptionsEnabled) {
+        handleBadState();
+    }
+    return -1;
 }
 
 long long GzipInputStream::tell() {

@@ -8,11 +8,17 @@
 namespace IO {
 namespace Zip {
 
-// Inflates a whole zlib or gzip stream when constructed and then reads from memory. Input that
-// is not compressed data comes through unchanged; a stream that fails to inflate is empty
-// (available 0, reads -1). Not thread-safe: one thread uses the stream.
+// Inflates a whole zlib or gzip stream when constructed and then reads from memory. Input without
+// a gzip or zlib header comes through unchanged; damaged, truncated or oversized compressed data
+// leaves the stream empty (available 0, reads -1, or IO::Exception once exceptions are enabled),
+// with the error logged. Not thread-safe: one thread uses the stream.
 class GzipInputStream : public InputStream {
 public:
+    // The largest content inflated. What we gunzip (server answers, settings files, statistics)
+    // is a few MB at most; a hostile stream that inflates further stops here instead of taking
+    // the device's memory.
+    static const int kMaxInflatedSize = 64 << 20;
+
     // Reads everything compressed has left; compressed is only borrowed during construction.
     explicit GzipInputStream(InputStream* compressed);
 
@@ -24,6 +30,8 @@ public:
 
 private:
     bool inflateAll(const std::vector<unsigned char>& input);
+    // Logs why inflating stopped and drops any partial content; false.
+    bool fail(int result);
 
     std::vector<unsigned char> data;
     boost::shared_ptr<ByteArrayInputStream> inner;

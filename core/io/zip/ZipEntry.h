@@ -17,8 +17,11 @@ struct ZipEntry {
     std::vector<unsigned char> extra;
     unsigned int compressedSize = 0;
     unsigned int uncompressedSize = 0;
-    // Position in the archive of the entry's first data byte, after its local header.
-    long long dataOffset = 0;
+    // Where the entry's record lies in the central directory, so that opening the entry goes
+    // straight there instead of searching the directory. Its local header (and so where its
+    // data begins) is read only when the entry is opened.
+    unsigned long long directoryPosition = 0;
+    unsigned long long entryNumber = 0;
 };
 
 // An archive's index: entry name to entry, matched exactly.

@@ -1,21 +1,30 @@
 #include "io/zip/ZipFile.h"
 
+#include <algorithm>
 #include <boost/make_shared.hpp>
 #include <climits>
+#include <cstring>
 #include <new>
 #include <vector>
 
 #include "io/BufferInputStream.h"
 #include "io/zip/impl/StoredZipInputStream.h"
 #include "io/zip/impl/UncachedZipInputStream.h"
+#include "util/Logger.h"
 
 namespace IO {
 namespace Zip {
 
 namespace {
 
-InputStream* asStream(voidpf stream) {
-    return static_cast<InputStream*>(stream);
+// Deflate's densest form carries about 1032 output bytes per input byte.
+const unsigned long long kMaxDeflateRatio = 1032;
+
+// minizip reads a directory record in many small pieces; they come from this much read ahead.
+const size_t kReadAhead = 16 * 1024;
+
+ZipFile* asZip(voidpf opaque) {
+    return static_cast<ZipFile*>(opaque);
 }
 
 }  // namespace
@@ -31,25 +40,50 @@ ZipFile::~ZipFile() {
 voidpf ZCALLBACK ZipFile::openFile(voidpf opaque, const void* filename, int) {
     // minizip needs a file name; the archive is always opened under this one.
     KD_ASSERT(kdStrcmp(static_cast<const char*>(filename), "res") == 0);
-    asStream(opaque)->seek(0, KD_SEEK_SET);
+    asZip(opaque)->position = 0;
     return opaque;
 }
 
-uLong ZCALLBACK ZipFile::readFile(voidpf, voidpf stream, void* buffer, uLong size) {
+uLong ZCALLBACK ZipFile::readFile(voidpf, voidpf zip, void* buffer, uLong size) {
+    return asZip(zip)->readArchive(static_cast<unsigned char*>(buffer), size);
+}
+
+uLong ZipFile::readArchive(unsigned char* buffer, uLong size) {
     // minizip asks past the end only on a damaged archive and handles a short read itself; the
-    // stream must not see it as a bad state (that would assert, or throw through C code).
-    long long left = asStream(stream)->available();
-    if (left <= 0) {
-        return 0;
+    // stream must not see it as a bad state (that would assert, or throw through C code). The
+    // stream is positioned before every read of it: entry windows share it and move it.
+    uLong done = 0;
+    while (done < size && position < archiveSize) {
+        const unsigned long long wanted = std::min<unsigned long long>(
+            size - done, static_cast<unsigned long long>(archiveSize - position));
+        if (position >= aheadStart && position < aheadStart + static_cast<long long>(ahead.size())) {
+            const size_t at = static_cast<size_t>(position - aheadStart);
+            const size_t count = static_cast<size_t>(std::min<unsigned long long>(wanted, ahead.size() - at));
+            std::memcpy(buffer + done, ahead.data() + at, count);
+            done += count;
+            position += count;
+            continue;
+        }
+        stream->seek(position, KD_SEEK_SET);
+        if (wanted >= kReadAhead) {
+            const int count =
+                stream->read(buffer + done, static_cast<int>(std::min<unsigned long long>(wanted, INT_MAX)));
+            if (count <= 0) {
+                break;
+            }
+            done += count;
+            position += count;
+            continue;
+        }
+        ahead.resize(static_cast<size_t>(std::min<long long>(kReadAhead, archiveSize - position)));
+        const int count = stream->read(ahead.data(), static_cast<int>(ahead.size()));
+        aheadStart = position;
+        ahead.resize(count > 0 ? count : 0);
+        if (ahead.empty()) {
+            break;
+        }
     }
-    if (static_cast<unsigned long long>(left) < size) {
-        size = static_cast<uLong>(left);
-    }
-    if (size > INT_MAX) {
-        size = INT_MAX;
-    }
-    int count = asStream(stream)->read(buffer, static_cast<int>(size));
-    return count > 0 ? static_cast<uLong>(count) : 0;
+    return done;
 }
 
 uLong ZCALLBACK ZipFile::writeFile(voidpf, voidpf, const void*, uLong) {
@@ -57,13 +91,29 @@ uLong ZCALLBACK ZipFile::writeFile(voidpf, voidpf, const void*, uLong) {
     return static_cast<uLong>(-1);
 }
 
-ZPOS64_T ZCALLBACK ZipFile::tellFile(voidpf, voidpf stream) {
-    return static_cast<ZPOS64_T>(asStream(stream)->tell());
+ZPOS64_T ZCALLBACK ZipFile::tellFile(voidpf, voidpf zip) {
+    return static_cast<ZPOS64_T>(asZip(zip)->position);
 }
 
-long ZCALLBACK ZipFile::seekFile(voidpf, voidpf stream, ZPOS64_T offset, int origin) {
-    // minizip numbers its origins as the platform does.
-    asStream(stream)->seek(static_cast<long long>(offset), static_cast<KDfileSeekOrigin>(origin));
+long ZCALLBACK ZipFile::seekFile(voidpf, voidpf zip, ZPOS64_T offset, int origin) {
+    ZipFile* self = asZip(zip);
+    long long target = static_cast<long long>(offset);
+    switch (origin) {
+        case ZLIB_FILEFUNC_SEEK_SET:
+            break;
+        case ZLIB_FILEFUNC_SEEK_CUR:
+            target += self->position;
+            break;
+        case ZLIB_FILEFUNC_SEEK_END:
+            target += self->archiveSize;
+            break;
+        default:
+            return -1;
+    }
+    if (target < 0) {
+        return -1;
+    }
+    self->position = target;
     return 0;
 }
 
@@ -100,6 +150,7 @@ bool ZipFile::open(boost::shared_ptr<InputStream> archive) {
     KD_ASSERT(!file);
     index = boost::make_shared<const ZipEntryMap>();
     stream = archive;
+    archiveSize = stream->tell() + stream->available();
     functions.zopen64_file = &ZipFile::openFile;
     functions.zread_file = &ZipFile::readFile;
     functions.zwrite_file = &ZipFile::writeFile;
@@ -107,7 +158,7 @@ bool ZipFile::open(boost::shared_ptr<InputStream> archive) {
     functions.zseek64_file = &ZipFile::seekFile;
     functions.zclose_file = &ZipFile::closeFile;
     functions.zerror_file = &ZipFile::testError;
-    functions.opaque = stream.get();
+    functions.opaque = this;
 
     file = unzOpen2_64("res", &functions);
     if (!file) {
@@ -124,6 +175,8 @@ bool ZipFile::buildIndex() {
         return false;
     }
     boost::shared_ptr<ZipEntryMap> entries = boost::make_shared<ZipEntryMap>();
+    // The count is a claim; a directory record takes at least 46 bytes of the archive.
+    entries->reserve(static_cast<size_t>(std::min<unsigned long long>(info.number_entry, archiveSize / 46)));
     for (ZPOS64_T i = 0; i < info.number_entry; ++i) {
         int result = i == 0 ? unzGoToFirstFile(file) : unzGoToNextFile(file);
         if (result != UNZ_OK) {
@@ -135,19 +188,43 @@ bool ZipFile::buildIndex() {
             KD_ASSERT(false);
             return false;
         }
-        (*entries)[entry.name] = entry;
+        const std::string name = entry.name;
+        (*entries)[name] = std::move(entry);
     }
     index = entries;
     return true;
 }
 
 bool ZipFile::readCurrentEntry(ZipEntry& entry) {
-    // Sizes first, then every text at its full length: a fixed name buffer would cut long names
-    // and leave them unterminated.
+    // Most entries fit these buffers and are read in one call; a longer name, extra field or
+    // any comment is read again at its full length (a cut name would be unterminated).
     unz_file_info64 info;
-    if (unzGetCurrentFileInfo64(file, &info, nullptr, 0, nullptr, 0, nullptr, 0) != UNZ_OK) {
+    char name[256];
+    unsigned char extra[64];
+    if (unzGetCurrentFileInfo64(file, &info, name, sizeof(name), extra, sizeof(extra), nullptr, 0) !=
+        UNZ_OK) {
         return false;
     }
+    if (info.size_filename < sizeof(name) && info.size_file_extra <= sizeof(extra) &&
+        info.size_file_comment == 0) {
+        entry.name.assign(name, info.size_filename);
+        entry.extra.assign(extra, extra + info.size_file_extra);
+    } else if (!readCurrentTexts(entry, info)) {
+        return false;
+    }
+    entry.compressed = info.compression_method != 0;
+    entry.compressedSize = static_cast<unsigned int>(info.compressed_size);
+    entry.uncompressedSize = static_cast<unsigned int>(info.uncompressed_size);
+    unz64_file_pos position;
+    if (unzGetFilePos64(file, &position) != UNZ_OK) {
+        return false;
+    }
+    entry.directoryPosition = position.pos_in_zip_directory;
+    entry.entryNumber = position.num_of_file;
+    return true;
+}
+
+bool ZipFile::readCurrentTexts(ZipEntry& entry, unz_file_info64& info) {
     std::vector<char> name(info.size_filename + 1);
     entry.extra.resize(info.size_file_extra);
     std::vector<char> comment(info.size_file_comment + 1);
@@ -157,15 +234,7 @@ bool ZipFile::readCurrentEntry(ZipEntry& entry) {
     }
     entry.name.assign(name.data(), info.size_filename);
     entry.comment.assign(comment.data(), info.size_file_comment);
-    entry.compressed = info.compression_method != 0;
-    entry.compressedSize = static_cast<unsigned int>(info.compressed_size);
-    entry.uncompressedSize = static_cast<unsigned int>(info.uncompressed_size);
-
-    if (unzOpenCurrentFile(file) != UNZ_OK) {
-        return false;
-    }
-    entry.dataOffset = static_cast<long long>(unzGetCurrentFileZStreamPos64(file));
-    return unzCloseCurrentFile(file) == UNZ_OK;
+    return true;
 }
 
 const ZipEntry* ZipFile::findEntry(const std::string& name) const {
@@ -178,13 +247,15 @@ boost::shared_ptr<InputStream> ZipFile::getInputStream(const ZipEntry& entry, bo
         KD_ASSERT(false);
         return boost::shared_ptr<InputStream>();
     }
-    if (!entry.compressed) {
-        return boost::shared_ptr<InputStream>(
-            new StoredZipInputStream(shared_from_this(), stream, entry.dataOffset, entry.uncompressedSize));
-    }
-    if (unzLocateFile(file, entry.name.c_str(), 1) != UNZ_OK) {
+    long long dataOffset = 0;
+    if (!openCurrent(entry, dataOffset)) {
         KD_ASSERT(false);
         return boost::shared_ptr<InputStream>();
+    }
+    if (!entry.compressed) {
+        unzCloseCurrentFile(file);
+        return boost::shared_ptr<InputStream>(
+            new StoredZipInputStream(shared_from_this(), stream, dataOffset, entry.uncompressedSize));
     }
     if (cached) {
         return inflateWhole(entry);
@@ -192,12 +263,40 @@ boost::shared_ptr<InputStream> ZipFile::getInputStream(const ZipEntry& entry, bo
     return boost::shared_ptr<InputStream>(new UncachedZipInputStream(shared_from_this(), entry));
 }
 
-boost::shared_ptr<InputStream> ZipFile::inflateWhole(const ZipEntry& entry) {
-    if (entry.uncompressedSize > INT_MAX || unzOpenCurrentFile(file) != UNZ_OK) {
-        KD_ASSERT(false);
-        return boost::shared_ptr<InputStream>();
+bool ZipFile::openCurrent(const ZipEntry& entry, long long& dataOffset) {
+    unz64_file_pos position = {entry.directoryPosition, entry.entryNumber};
+    // A stored entry is read through a window of the archive; only where its data begins is
+    // wanted, so it is opened raw.
+    if (unzGoToFilePos64(file, &position) != UNZ_OK ||
+        unzOpenCurrentFile2(file, nullptr, nullptr, entry.compressed ? 0 : 1) != UNZ_OK) {
+        return false;
     }
-    unsigned char* bytes = new (std::nothrow) unsigned char[entry.uncompressedSize];
+    dataOffset = static_cast<long long>(unzGetCurrentFileZStreamPos64(file));
+    if (claimsFit(entry, dataOffset)) {
+        return true;
+    }
+    Logger::log(Logger::Error, "ZipFile: entry %s claims more data than the archive holds",
+                entry.name.c_str());
+    unzCloseCurrentFile(file);
+    return false;
+}
+
+bool ZipFile::claimsFit(const ZipEntry& entry, long long dataOffset) const {
+    // Sizes from the directory are claims: nothing is sized from them unless the archive could
+    // hold that much.
+    if (dataOffset < 0 || dataOffset > archiveSize || entry.compressedSize > archiveSize - dataOffset) {
+        return false;
+    }
+    if (!entry.compressed) {
+        return entry.compressedSize == entry.uncompressedSize;
+    }
+    return entry.uncompressedSize <= kMaxDeflateRatio * entry.compressedSize;
+}
+
+boost::shared_ptr<InputStream> ZipFile::inflateWhole(const ZipEntry& entry) {
+    unsigned char* bytes = entry.uncompressedSize <= INT_MAX
+                               ? new (std::nothrow) unsigned char[entry.uncompressedSize]
+                               : nullptr;
     int count = bytes ? unzReadCurrentFile(file, bytes, entry.uncompressedSize) : -1;
     // Closing checks the CRC. A short or damaged entry must not be handed out: the caller
     // would read uninitialised or corrupt bytes as the resource.

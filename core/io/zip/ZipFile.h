@@ -6,6 +6,7 @@
 #include <boost/noncopyable.hpp>
 #include <boost/shared_ptr.hpp>
 #include <string>
+#include <vector>
 
 #include "io/InputStream.h"
 #include "io/zip/ZipEntry.h"
@@ -37,7 +38,8 @@ public:
 
     // A stored entry comes as a window of the archive stream whatever cached says; a compressed
     // one either inflated whole into memory (cached) or inflated while read (uncached, one at a
-    // time per zip file). Empty, with an assertion failure, when the entry cannot be opened.
+    // time per zip file). Empty, with an assertion failure, when the entry cannot be opened or its
+    // sizes claim more than the archive can hold. Goes straight to the entry's directory record.
     boost::shared_ptr<InputStream> getInputStream(const ZipEntry& entry, bool cached);
 
 private:
@@ -46,7 +48,16 @@ private:
     bool open(boost::shared_ptr<InputStream> archive);
     bool buildIndex();
     bool readCurrentEntry(ZipEntry& entry);
+    bool readCurrentTexts(ZipEntry& entry, unz_file_info64& info);
+    // Makes entry minizip's current entry and opens it; false when it cannot be opened or claims
+    // more than the archive holds.
+    bool openCurrent(const ZipEntry& entry, long long& dataOffset);
+    bool claimsFit(const ZipEntry& entry, long long dataOffset) const;
+    // Reads the open current entry whole and closes it.
     boost::shared_ptr<InputStream> inflateWhole(const ZipEntry& entry);
+
+    // Serves minizip's reads from a window of the archive read ahead.
+    uLong readArchive(unsigned char* buffer, uLong size);
 
     static voidpf ZCALLBACK openFile(voidpf opaque, const void* filename, int mode);
     static uLong ZCALLBACK readFile(voidpf opaque, voidpf stream, void* buffer, uLong size);
@@ -59,6 +70,11 @@ private:
     // Uncached entry streams open now (0 or 1): such a stream owns minizip's current entry.
     int openStreams = 0;
     boost::shared_ptr<InputStream> stream;
+    long long archiveSize = 0;
+    // minizip's position in the archive, and what was last read ahead from where.
+    long long position = 0;
+    std::vector<unsigned char> ahead;
+    long long aheadStart = 0;
     unzFile file = nullptr;
     zlib_filefunc64_def functions;
     boost::shared_ptr<const ZipEntryMap> index;

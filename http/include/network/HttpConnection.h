@@ -47,6 +47,8 @@ public:
     void setOnResponseReceivedCallback(OnResponseReceivedCallback callback);
     // wholeBody true: the body arrives in one call when complete (not at all
     // when it is empty or the transfer fails); false: in parts as received.
+    // Parts are held back, not piled up, while about a megabyte of them waits
+    // for the caller thread; the silence timeout does not run meanwhile.
     void setOnBodyDataReceivedCallback(OnBodyDataReceivedCallback callback, bool wholeBody);
 
     // Starts the exchange; the calling thread becomes the caller thread. A

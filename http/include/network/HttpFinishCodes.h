@@ -14,7 +14,9 @@ const int HTTP_CONNECTION_REFUSED_ERROR_CODE = -3;
 const int HTTP_HOST_NOT_RESOLVED_ERROR_CODE = -4;
 // The peer closed or reset the connection before the exchange was complete.
 const int HTTP_CONNECTION_LOST_ERROR_CODE = -5;
-// The server's answer is not valid HTTP, or it redirects in loops.
+// The server's answer is not valid HTTP (a head cut short, a Content-Length
+// that is not one clear number, broken chunks, a head beyond libcurl's
+// limits), or it redirects in loops.
 const int HTTP_BAD_RESPONSE_ERROR_CODE = -6;
 // The request cannot be made: malformed URL or a scheme other than http(s).
 const int HTTP_BAD_REQUEST_ERROR_CODE = -7;

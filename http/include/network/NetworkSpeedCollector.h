@@ -11,7 +11,10 @@ class HttpConnection;
 class NetworkSpeedCollector {
 public:
     virtual ~NetworkSpeedCollector() {}
-    // The request left (its size is then known through the connection).
+    // Once per connection: when the request, head and body, has been written
+    // to the socket, whether an answer follows or not, or at the latest when
+    // the answer's head arrives (its size is then known through the
+    // connection).
     virtual void onRequestSent(int id, HttpConnection* connection) = 0;
     virtual void onRequestFinished(int id) = 0;
     // One block of response body as it arrived from the socket.

@@ -58,7 +58,9 @@ void kdSetError(KDint error);
 
 /* Assertions: library code asserts through KD_ASSERT, which passes the
  * expression text. The handler may return (tests install one that records);
- * the code then continues as if the assertion had held. */
+ * the code then continues as if the assertion had held. The default handler
+ * logs the failure, then aborts in a debug build and returns in a release
+ * build (NDEBUG). */
 void kdHandleAssertion(const KDchar *condition, const KDchar *filename, KDint linenumber);
 #define KD_ASSERT(c) ((c) ? (void)0 : kdHandleAssertion(#c, __FILE__, __LINE__))
 

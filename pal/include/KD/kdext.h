@@ -60,6 +60,10 @@ KDint kdThreadSetSchedParamZVR(KDThread *thread, KDint policy, const KDint *para
 KDint64 kdMkTimeZVR(const KDTm *tm);
 /* Creates every missing directory of the path; 0 on success. */
 KDint kdMkdirAllZVR(const KDchar *pathname);
+/* kdStat of the path itself: a symbolic link is not followed and reports
+ * KD_ISLNK_ZVR (and neither KD_ISREG nor KD_ISDIR). */
+#define KD_ISLNK_ZVR(m) (((m)&0x2000) != 0)
+KDint kdLstatZVR(const KDchar *pathname, KDStat *buf);
 
 /* Device. kdGetStringZVR ids: 0 application platform, 1 device model,
  * 2 manufacturer, 3 operating-system version, 4 resource package name,

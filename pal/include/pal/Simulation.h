@@ -55,7 +55,8 @@ std::uint64_t timerFireCount();
 // --- Assertions and log ---------------------------------------------------
 
 using AssertionHandler = std::function<void(const char* expression, const char* file, int line)>;
-// An empty handler restores the default, which logs and aborts.
+// An empty handler restores the default, which logs, then aborts in a debug
+// build and returns in a release build (NDEBUG).
 void setAssertionHandler(AssertionHandler handler);
 using LogSink = std::function<void(const char* line)>;
 // An empty sink restores the default, stderr.

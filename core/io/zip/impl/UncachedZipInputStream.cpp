@@ -7,7 +7,6 @@ namespace Zip {
 
 UncachedZipInputStream::UncachedZipInputStream(boost::shared_ptr<ZipFile> file, const ZipEntry& entry)
     : file(file), entry(entry) {
-    KD_ASSERT(unzOpenCurrentFile(file->file) == (0));
     ++file->openStreams;
 }
 
@@ -28,6 +27,9 @@ int UncachedZipInputStream::read(void* buffer, int len) {
     int count = unzReadCurrentFile(file->file, buffer, static_cast<unsigned>(len));
     if (count > 0) {
         position += count;
+    }
+    if (count < len) {
+        handleBadState();
     }
     return count;
 }

@@ -16,12 +16,13 @@ class ZipFile;
 // Not thread-safe: the zip file's thread only.
 class UncachedZipInputStream : public InputStream, private boost::noncopyable {
 public:
-    // The zip file's current entry must already be the entry.
+    // Takes over the zip file's current entry, which must be the entry and open.
     UncachedZipInputStream(boost::shared_ptr<ZipFile> file, const ZipEntry& entry);
     ~UncachedZipInputStream() override;
 
     long long available() override;
-    // Returns what minizip delivers: short at the end, negative on a corrupt entry.
+    // Returns what minizip delivers: short at the end, negative on a corrupt entry; either is a
+    // bad state (an exception once exceptions are enabled).
     int read(void* buffer, int length) override;
     long long tell() override;
     void seek(long long offset, KDfileSeekOrigin origin) override;

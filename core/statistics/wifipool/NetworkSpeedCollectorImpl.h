@@ -1,0 +1,56 @@
+#pragma once
+
+#include <boost/noncopyable.hpp>
+#include <boost/shared_ptr.hpp>
+#include <vector>
+
+#include "network/NetworkSpeedCollector.h"
+#include "statistics/wifipool/RequestInfo.h"
+#include "util/ThreadCallback.h"
+
+namespace Statistics {
+
+// Turns the HTTP engine's reports into request records for the Wi-Fi pool
+// chunks. The reports may come from any thread; each is posted to the owner
+// thread (the constructing one, which must pump platform events), where all
+// records are kept and changed, so no lock is needed. pop() and destruction
+// belong to the owner thread.
+class NetworkSpeedCollectorImpl : public Network::NetworkSpeedCollector, private boost::noncopyable {
+public:
+    // The largest batch pop() hands out.
+    static const int MAX_REQUEST_COUNT = 10;
+
+    NetworkSpeedCollectorImpl();
+
+    void onRequestSent(int id, Network::HttpConnection* connection) override;
+    void onRequestFinished(int id) override;
+    void onDataChunkReceived(int id, Network::DataChunk* dataChunk) override;
+    void onRequestCanceled(int id) override;
+
+    // Hands out the first MAX_REQUEST_COUNT records in order of their sending
+    // and forgets all records; later reports for their ids are ignored.
+    void pop(std::vector<boost::shared_ptr<RequestInfo> >& outRequests);
+
+private:
+    typedef boost::shared_ptr<Util::ThreadCallback::Context> ContextPtr;
+
+    void post(Util::ThreadCallback::Function function, int id,
+              const boost::shared_ptr<RequestInfo>& requestInfo,
+              const boost::shared_ptr<ChunkInfo>& chunkInfo);
+
+    void onRequestSentImpl(ContextPtr context);
+    void onRequestFinishedImpl(ContextPtr context);
+    void onChunkReceivedImpl(ContextPtr context);
+    void onRequestCanceledImpl(ContextPtr context);
+
+    boost::shared_ptr<RequestInfo> findRequestInfo(int id) const;
+
+    Util::ThreadCallback threadCallback;
+    Util::ThreadCallback::Function onRequestSentCallback;
+    Util::ThreadCallback::Function onRequestFinishedCallback;
+    Util::ThreadCallback::Function onChunkReceivedCallback;
+    Util::ThreadCallback::Function onRequestCanceledCallback;
+    std::vector<boost::shared_ptr<RequestInfo> > requests;
+};
+
+}  // namespace Statistics

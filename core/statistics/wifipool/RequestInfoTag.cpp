@@ -1,0 +1,25 @@
+#include "statistics/wifipool/RequestInfoTag.h"
+
+#include <sstream>
+
+namespace Statistics {
+
+void RequestInfoTag::appendNodeName(std::string& out) const {
+    out += "r";
+}
+
+void RequestInfoTag::appendNodeTagText(std::string& out) const {
+    std::ostringstream text;
+    text << "type=\"" << escape(info->path) << "\"";
+    if (info->precision == Location::PrecisionSatellite) {
+        // Two spaces before lon: the form the server has always been sent.
+        text << " lat=\"" << info->location.latitude << "\"  lon=\"" << info->location.longitude << "\"";
+    }
+    out += text.str();
+}
+
+void RequestInfoTag::appendContentText(std::string& out) const {
+    (void)out;
+}
+
+}  // namespace Statistics
