@@ -1,8 +1,19 @@
 # Thin wrapper over CMake + Ninja. BUILD_DIR may be overridden, e.g. for a
 # sanitizer build: make test BUILD_DIR=build-tsan CMAKE_ARGS=-DMAPCORE_SANITIZE=thread
+# TARGETS and CTEST_ARGS narrow a run, e.g. TARGETS=tests_pal CTEST_ARGS="-L pal".
 BUILD_DIR ?= build
 CMAKE_ARGS ?=
+TARGETS ?=
+CTEST_ARGS ?=
 JOBS ?= $(shell nproc)
+
+# Sanitizer builds (and the fuzz targets) stop at the first report with a failing status and skip
+# only the third-party noise listed in scripts/sanitizers/. Plain builds ignore these variables.
+SANITIZER_FILES := $(CURDIR)/scripts/sanitizers
+export ASAN_OPTIONS ?= detect_leaks=1:halt_on_error=1
+export LSAN_OPTIONS ?= suppressions=$(SANITIZER_FILES)/lsan.supp:print_suppressions=0
+export UBSAN_OPTIONS ?= halt_on_error=1:print_stacktrace=1
+export TSAN_OPTIONS ?= halt_on_error=1:second_deadlock_stack=1:suppressions=$(SANITIZER_FILES)/tsan.supp
 # make fuzz: the libFuzzer targets (clang, ASan+UBSan) in their own folder, each run in turn for
 # FUZZ_SECONDS. New inputs go to FUZZ_DIR/work/<Name>, findings to FUZZ_DIR/findings/, so the
 # checked-in seed corpus only grows by hand.
@@ -18,10 +29,10 @@ configure: deps
 	@cmake -S . -B $(BUILD_DIR) -G Ninja $(CMAKE_ARGS) >/dev/null
 
 build: configure
-	@cmake --build $(BUILD_DIR) -j $(JOBS)
+	@cmake --build $(BUILD_DIR) -j $(JOBS) $(if $(TARGETS),--target $(TARGETS))
 
 test: build
-	@ctest --test-dir $(BUILD_DIR) --output-on-failure -j $(JOBS)
+	@ctest --test-dir $(BUILD_DIR) --output-on-failure -j $(JOBS) $(CTEST_ARGS)
 
 demo: build
 	@$(BUILD_DIR)/examples/demo/mapcore_demo

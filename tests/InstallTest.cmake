@@ -11,7 +11,13 @@ function(run)
   set(output "${out}" PARENT_SCOPE)
 endfunction()
 
+# cmake --install records what it copied in the build folder. A record left by
+# another user (root, say) could not be overwritten, and one kept afterwards
+# would list files of a prefix that is gone, so the record lives only here.
+set(manifest ${BUILD_DIR}/install_manifest.txt)
+file(REMOVE ${manifest})
 run(${CMAKE_COMMAND} --install ${BUILD_DIR} --prefix ${WORK_DIR}/prefix)
+file(REMOVE ${manifest})
 run(${CMAKE_COMMAND} -S ${CONSUMER_DIR} -B ${WORK_DIR}/build -G Ninja -DCMAKE_PREFIX_PATH=${WORK_DIR}/prefix)
 run(${CMAKE_COMMAND} --build ${WORK_DIR}/build)
 run(${WORK_DIR}/build/consumer)
