@@ -1,11 +1,13 @@
 # Thin wrapper over CMake + Ninja. BUILD_DIR may be overridden, e.g. for a
 # sanitizer build: make test BUILD_DIR=build-tsan CMAKE_ARGS=-DMAPCORE_SANITIZE=thread
-# TARGETS and CTEST_ARGS narrow a run, e.g. TARGETS=tests_pal CTEST_ARGS="-L pal".
+# AREAS narrows a test run to some test areas (AREAS="pal http"), TARGETS a build to some targets.
 BUILD_DIR ?= build
 CMAKE_ARGS ?=
-TARGETS ?=
-CTEST_ARGS ?=
+AREAS ?=
+TARGETS ?= $(addprefix tests_,$(AREAS))
 JOBS ?= $(shell nproc)
+empty :=
+space := $(empty) $(empty)
 
 # Sanitizer builds (and the fuzz targets) stop at the first report with a failing status and skip
 # only the third-party noise listed in scripts/sanitizers/. Plain builds ignore these variables.
@@ -32,7 +34,8 @@ build: configure
 	@cmake --build $(BUILD_DIR) -j $(JOBS) $(if $(TARGETS),--target $(TARGETS))
 
 test: build
-	@ctest --test-dir $(BUILD_DIR) --output-on-failure -j $(JOBS) $(CTEST_ARGS)
+	@ctest --test-dir $(BUILD_DIR) --output-on-failure -j $(JOBS) \
+	  $(if $(AREAS),-L '^($(subst $(space),|,$(strip $(AREAS))))$$')
 
 demo: build
 	@$(BUILD_DIR)/examples/demo/mapcore_demo
