@@ -4,6 +4,13 @@
 # their Debian dependencies again through pkg-config.
 include(CMakePackageConfigHelpers)
 
+# A sanitizer build's libraries call into the sanitizer runtime, so whatever
+# links an installed copy of them must link that runtime too.
+if(MAPCORE_SANITIZE)
+  set_property(TARGET pal APPEND PROPERTY INTERFACE_LINK_OPTIONS
+               $<INSTALL_INTERFACE:-fsanitize=${MAPCORE_SANITIZE}>)
+endif()
+
 install(TARGETS pal mapcore_http mapcore
         EXPORT mapcoreTargets
         ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR})
