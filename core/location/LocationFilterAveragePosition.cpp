@@ -8,28 +8,32 @@ namespace Location {
 namespace {
 
 const size_t kWindowSize = 3;
+// Carrying a fix further than this across a gap guesses more than it knows.
+const float kMaxCarrySeconds = 5.0f;
 
 // A fix without a speed is averaged where it stands, as it always was: a
 // receiver that never reports speed gives nothing to carry its fixes by.
-bool carryingVelocity(const Location& fix, float& vx, float& vy) {
+bool carryingVelocity(const Location& fix, float& east, float& north) {
     if (fix.speed < 0.0f) {
-        vx = 0.0f;
-        vy = 0.0f;
+        east = 0.0f;
+        north = 0.0f;
         return true;
     }
-    return Motion::velocityXY(fix, vx, vy);
+    return Motion::velocity(fix, east, north);
 }
 
-// World coordinates saturate at the int32 limits, as CoordConversion's do.
-KDint32 shifted(KDint32 value, float by) {
-    const double moved = static_cast<double>(value) + kdRoundf(by);
-    if (moved >= 2147483647.0) {
-        return 0x7FFFFFFF;
+// The shorter way round, so that fixes either side of the date line average
+// next to it rather than at the far side of the world.
+float longitudeDifference(float from, float to) {
+    const float difference = to - from;
+    if (difference > 180.0f) {
+        return difference - 360.0f;
     }
-    if (moved <= -2147483648.0) {
-        return -0x7FFFFFFF - 1;
-    }
-    return static_cast<KDint32>(moved);
+    return difference < -180.0f ? difference + 360.0f : difference;
+}
+
+float wrapLongitude(float longitude) {
+    return longitudeDifference(0.0f, longitude);
 }
 
 }  // namespace
@@ -39,7 +43,8 @@ KDint32 shifted(KDint32 value, float by) {
 // newest one's time along the velocities the fixes report, between each two
 // fixes by the mean of their velocities so that a turn between them is shared.
 // Standing fixes are not moved and average as before. A fix that moves
-// without saying where ends the carrying: it and older fixes are left out.
+// without saying where, or across a long gap, ends the carrying: it and older
+// fixes are left out.
 // Sums run over offsets from the newest fix, which single precision keeps
 // exactly, rather than over whole latitudes.
 Location LocationFilterAveragePosition::filter(const Location& location) {
@@ -48,39 +53,41 @@ Location LocationFilterAveragePosition::filter(const Location& location) {
         window.pop_front();
     }
     const Location& newest = window.back();
+    float latitudePerMetre, longitudePerMetre;
+    Motion::degreesPerMetre(newest.latitude, latitudePerMetre, longitudePerMetre);
     float latitudeOffset = 0.0f;
     float longitudeOffset = 0.0f;
     float altitudeSum = newest.altitude;
     size_t count = 1;
-    float carryX = 0.0f;
-    float carryY = 0.0f;
-    float laterVx, laterVy;
-    bool laterKnown = carryingVelocity(newest, laterVx, laterVy);
-    for (size_t i = window.size() - 1; laterKnown && i-- > 0;) {
+    float carriedEast = 0.0f;
+    float carriedNorth = 0.0f;
+    float laterEast, laterNorth;
+    const bool newestKnown = carryingVelocity(newest, laterEast, laterNorth);
+    for (size_t i = window.size() - 1; newestKnown && i-- > 0;) {
         const Location& older = window[i];
-        float vx, vy;
-        if (!carryingVelocity(older, vx, vy)) {
+        float east, north;
+        if (!carryingVelocity(older, east, north)) {
             break;
         }
         const float seconds = Motion::secondsBetween(older, window[i + 1]);
-        carryX += 0.5f * (vx + laterVx) * seconds;
-        carryY += 0.5f * (vy + laterVy) * seconds;
-        float latitude = older.latitude;
-        float longitude = older.longitude;
-        if (carryX != 0.0f || carryY != 0.0f) {
-            CoordConversion::toLL(shifted(older.x, carryX), shifted(older.y, carryY), latitude, longitude);
+        const bool moved = east != 0.0f || north != 0.0f || laterEast != 0.0f || laterNorth != 0.0f;
+        if (moved && seconds > kMaxCarrySeconds) {
+            break;
         }
-        latitudeOffset += latitude - newest.latitude;
-        longitudeOffset += longitude - newest.longitude;
+        carriedEast += 0.5f * (east + laterEast) * seconds;
+        carriedNorth += 0.5f * (north + laterNorth) * seconds;
+        latitudeOffset += older.latitude - newest.latitude + carriedNorth * latitudePerMetre;
+        longitudeOffset +=
+            longitudeDifference(newest.longitude, older.longitude) + carriedEast * longitudePerMetre;
         altitudeSum += older.altitude;
         ++count;
-        laterVx = vx;
-        laterVy = vy;
+        laterEast = east;
+        laterNorth = north;
     }
     const float n = static_cast<float>(count);
     Location averaged = location;
     averaged.latitude = newest.latitude + latitudeOffset / n;
-    averaged.longitude = newest.longitude + longitudeOffset / n;
+    averaged.longitude = wrapLongitude(newest.longitude + longitudeOffset / n);
     averaged.altitude = altitudeSum / n;
     CoordConversion::toXY(averaged.latitude, averaged.longitude, averaged.x, averaged.y);
     return averaged;

@@ -179,11 +179,21 @@ float LocationFilterKalman::secondsSinceLast(const Location& fix) const {
     return Motion::secondsBetween(lastAccepted, fix);
 }
 
+// Latitude and longitude move from the fix's own by the estimate's offset
+// from it: a round trip of the whole position through single-precision world
+// coordinates would add a metre or more of rounding.
 Location LocationFilterKalman::adjustLocation(const Location& fix) const {
     Location adjusted = fix;
     adjusted.x = toWorld(static_cast<double>(originX) + estimate.x);
     adjusted.y = toWorld(static_cast<double>(originY) + estimate.y);
-    CoordConversion::toLL(adjusted.x, adjusted.y, adjusted.latitude, adjusted.longitude);
+    const Vector offset = estimate - measurementOf(fix);
+    float metresPerUnit = 0.0f;
+    CoordConversion::XYtoM(fix.latitude, 1000000, metresPerUnit);
+    metresPerUnit /= 1.0e6f;
+    float latitudePerMetre, longitudePerMetre;
+    Motion::degreesPerMetre(fix.latitude, latitudePerMetre, longitudePerMetre);
+    adjusted.latitude = fix.latitude - offset.y * metresPerUnit * latitudePerMetre;
+    adjusted.longitude = fix.longitude + offset.x * metresPerUnit * longitudePerMetre;
     adjusted.altitude = estimate.z;
     return adjusted;
 }
