@@ -1,5 +1,7 @@
 #include <gtest/gtest.h>
 
+#include <limits>
+
 #include "location/LocationFilterAverage.h"
 #include "location/LocationFilterAverageCourse.h"
 #include "location/LocationFilterAveragePosition.h"
@@ -150,6 +152,27 @@ TEST_F(LocationFilterTest, PositionAverageAcrossTheDateLineStaysThere) {
     }
     EXPECT_GT(kdFabsf(out.longitude), 179.999f);
     EXPECT_LE(kdFabsf(out.longitude), 180.0f);
+}
+
+// The provider cleans fixes before filtering; the position filters must not
+// turn what slips through into a position off the map.
+TEST_F(LocationFilterTest, UnusableSpeedsAndBearingsLeaveFinitePositions) {
+    const float nan = std::numeric_limits<float>::quiet_NaN();
+    const float inf = std::numeric_limits<float>::infinity();
+    const float values[][2] = {{nan, 90.0f}, {14.0f, nan}, {inf, 90.0f}, {14.0f, inf}, {-5.0f, 90.0f}};
+    for (const auto& value : values) {
+        Location::LocationFilterMinDistance minDistance;
+        Location::LocationFilterAveragePosition average;
+        Location::LocationFilterKalman kalman;
+        for (int i = 0; i < 6; ++i) {
+            Fix bad = fix(14.0f * i, 0, i + 1, value[0], value[1], 8.0f);
+            bad.fixTime = i % 2 == 0 ? 1000 * (i + 1) : std::numeric_limits<KDint64>::max();
+            for (const Fix& out : {average.filter(minDistance.filter(bad)), kalman.filter(bad)}) {
+                EXPECT_TRUE(out.hasUsablePosition()) << value[0] << " m/s at " << value[1] << ", fix " << i;
+                EXPECT_LT(metresBetween(bad, out), 100.0f) << value[0] << " m/s at " << value[1];
+            }
+        }
+    }
 }
 
 TEST_F(LocationFilterTest, CourseAverageIsCircular) {

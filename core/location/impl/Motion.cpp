@@ -14,6 +14,18 @@ const float kEccentricitySquared = 0.0066943800f;
 // without bound towards the pole.
 const float kMaxLatitude = 89.3f;
 
+// Faster than anything that carries a receiver.
+const float kMaxSpeed = 1.0e4f;
+
+// Written so that NaN is neither.
+bool hasSpeed(const Location& fix) {
+    return fix.speed >= 0.0f && fix.speed <= kMaxSpeed;
+}
+
+bool hasBearing(const Location& fix) {
+    return fix.bearing >= 0.0f && fix.bearing <= 360.0f;
+}
+
 }  // namespace
 
 const float kWalkingPace = 1.3888890f;
@@ -21,10 +33,10 @@ const float kWalkingPace = 1.3888890f;
 bool velocity(const Location& fix, float& east, float& north) {
     east = 0.0f;
     north = 0.0f;
-    if (fix.speed < 0.0f) {
+    if (!hasSpeed(fix)) {
         return false;
     }
-    if (fix.bearing < 0.0f) {
+    if (!hasBearing(fix)) {
         return fix.speed < kWalkingPace;
     }
     const float radians = BearingMath::degreesToRadians(fix.bearing);
@@ -46,7 +58,7 @@ bool velocityXY(const Location& fix, float& vx, float& vy) {
 }
 
 bool isMoving(const Location& fix) {
-    return fix.speed >= kWalkingPace && fix.bearing >= 0.0f;
+    return hasSpeed(fix) && fix.speed >= kWalkingPace && hasBearing(fix);
 }
 
 // From the meridian and prime-vertical radii of curvature.
