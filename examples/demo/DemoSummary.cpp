@@ -65,13 +65,14 @@ void summariseUploads(const std::vector<DevServer::UploadRecord>& uploads) {
         chunkTypes.size(), tally(chunkTypes).c_str());
 }
 
-// The files the server left in its data folder, by name.
-std::vector<std::string> serverFiles(const std::string& dataFolder) {
+// The files the server wrote in its data folder since the run started, by
+// name; a folder given again keeps the files of earlier runs.
+std::vector<std::string> serverFiles(const std::string& dataFolder, std::filesystem::file_time_type since) {
     std::vector<std::string> names;
     std::error_code error;
     for (const std::filesystem::directory_entry& entry :
          std::filesystem::directory_iterator(dataFolder, error)) {
-        if (entry.is_regular_file(error)) {
+        if (entry.is_regular_file(error) && entry.last_write_time(error) >= since) {
             names.push_back(entry.path().filename().string());
         }
     }
@@ -91,7 +92,7 @@ std::string describeServerFile(const std::string& name, const std::vector<DevSer
 }  // namespace
 
 void printSummary(const std::string& baseUrl, const DevServer::Journal& journal,
-                  const std::string& dataFolder) {
+                  const std::string& dataFolder, std::filesystem::file_time_type since) {
     say("=== summary ===");
     say("the development server at %s answered:", baseUrl.c_str());
     summariseStartups(journal.startups);
@@ -105,7 +106,7 @@ void printSummary(const std::string& baseUrl, const DevServer::Journal& journal,
     for (const std::pair<std::string, std::string>& file : notedFiles()) {
         say("  %s (%s)", file.first.c_str(), file.second.c_str());
     }
-    for (const std::string& name : serverFiles(dataFolder)) {
+    for (const std::string& name : serverFiles(dataFolder, since)) {
         say("  %s/%s (%s)", dataFolder.c_str(), name.c_str(),
             describeServerFile(name, journal.uploads).c_str());
     }

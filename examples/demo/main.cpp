@@ -222,13 +222,14 @@ int runApplication(const std::string& output) {
     }
     demo::say("main: development server on %s, data folder %s", server.baseUrl().c_str(), dataFolder.c_str());
     demo::setEnvironment(&server, output);
+    const std::filesystem::file_time_type started = std::filesystem::file_time_type::clock::now();
     demo::say("main: pal::run() starts the platform layer");
     int status = pal::run();
     demo::say("main: pal::run() returned %d", status);
     const std::string baseUrl = server.baseUrl();
     server.stop();
     const DevServer::Journal journal = server.journal();
-    demo::printSummary(baseUrl, journal, dataFolder);
+    demo::printSummary(baseUrl, journal, dataFolder, started);
     demo::setEnvironment(nullptr, output);
     if (!allUploadsDecoded(journal)) {
         demo::say("the server did not decode every upload of the statistics collector");
