@@ -97,6 +97,7 @@ public:
             demo::say("  server saw a startup request with uuid [%s], answered uuid %s, %zu parameters",
                       record.sentUuid.c_str(), record.answeredUuid.c_str(), record.params.size());
         }
+        Startup::StartupController::getInstance()->removeListener(listener.get());
         finished();
     }
 
