@@ -4,7 +4,6 @@
 #include <stdlib.h>
 
 #include <cstdint>
-#include <cstdio>
 #include <filesystem>
 #include <fstream>
 #include <string>
@@ -22,7 +21,10 @@
 // plugin and nothing without it: tests that need known samples ask for them.
 //
 // ALSA notices a changed configuration at the next device opening by the
-// file's identity, so each change writes a new file and renames it into place.
+// file's identity (device, inode, seconds of the last change), so each change
+// is a new file renamed into place. Every version keeps a name of its own
+// until the end, or a later version could get the inode of an earlier one
+// that ALSA still holds as current.
 class FakeCaptureDevice : public ::testing::Environment {
 public:
     void SetUp() override {
@@ -82,10 +84,15 @@ private:
     }
 
     static void configure(const std::string& text) {
+        static int versions = 0;
+        const std::string version = alsaConf() + "." + std::to_string(++versions);
         const std::string next = alsaConf() + ".next";
-        std::ofstream(next) << text;
+        std::ofstream(version) << text;
         std::error_code error;
-        std::filesystem::rename(next, alsaConf(), error);
+        std::filesystem::create_hard_link(version, next, error);
+        if (!error) {
+            std::filesystem::rename(next, alsaConf(), error);
+        }
         ASSERT_FALSE(error) << "cannot replace " << alsaConf() << ": " << error.message();
     }
 };
