@@ -162,6 +162,18 @@ std::vector<unsigned char> vorbisPrompt(long samplesPerChannel) {
     return out;
 }
 
+// Leaves bytes in the demo's output folder for the final summary.
+void saveOutput(const char* name, const std::vector<unsigned char>& bytes, const std::string& what) {
+    const std::string path = (std::filesystem::path(demo::outputFolder()) / name).string();
+    std::ofstream out(path, std::ios::binary);
+    out.write(reinterpret_cast<const char*>(bytes.data()), static_cast<std::streamsize>(bytes.size()));
+    if (out.good()) {
+        demo::noteFile(path, what);
+    } else {
+        demo::say("could not write %s", path.c_str());
+    }
+}
+
 class SoundScene;
 
 // Hands the recorder's slices to the scene; held by the scene, registered
@@ -241,6 +253,7 @@ private:
             "smaller",
             kSpeexQuality, encoder.getFrameSize(), spx->data.size(), spx->data.size() * 8 / seconds / 1000,
             static_cast<double>(speech.data.size()) / spx->data.size());
+        saveOutput("speech.spx", spx->data, "one second of captured speech in Ogg Speex; speexdec plays it");
     }
 
     void decodePrompt() {
@@ -256,6 +269,7 @@ private:
         demo::say("OggVorbisDecoder::decode() -> %s: %zu bytes of PCM, %.2f s", decoded ? "true" : "false",
                   pcmOut.data.size(),
                   static_cast<double>(pcmOut.data.size()) / (kPromptChannels * 2 * kPromptRate));
+        saveOutput("prompt.ogg", prompt.data, "the Vorbis prompt the sound scene decoded");
 
         Sound::SoundDataBuffer truncated;
         truncated.data.assign(prompt.data.begin(), prompt.data.begin() + prompt.data.size() * 2 / 3);
