@@ -43,6 +43,13 @@ std::string paramOf(const httplib::Request& request, const char* name) {
     return request.has_param(name) ? request.get_param_value(name) : std::string();
 }
 
+std::size_t contentLength(const httplib::Request& request) {
+    long long length = 0;
+    return Text::parseInteger(request.get_header_value("Content-Length"), 0, 1ll << 50, length)
+               ? static_cast<std::size_t>(length)
+               : request.body.size();
+}
+
 bool isPrintable(const std::string& text) {
     for (unsigned char c : text) {
         if (c < 0x20 || c == 0x7f) {
@@ -109,7 +116,7 @@ private:
     void onStartup(const httplib::Request& request, httplib::Response& response);
     void onPositioning(const httplib::Request& request, httplib::Response& response);
     void onUpload(const httplib::Request& request, httplib::Response& response);
-    void onAnswered(const httplib::Request& request, const httplib::Response& response);
+    void onError(const httplib::Request& request, httplib::Response& response);
 
     void storeUpload(UploadRecord& record);
     std::string newUuid();
@@ -180,7 +187,10 @@ void Server::Impl::route() {
     http->Get(R"(/cellid_location/?)",
               [this](const Request& request, Response& response) { onPositioning(request, response); });
     http->Post(R"(/wifipool/2\.x/?)", [this](const Request& request, Response& response) { onUpload(request, response); });
-    http->set_logger([this](const Request& request, const Response& response) { onAnswered(request, response); });
+    http->set_error_handler(httplib::Server::HandlerWithResponse([this](const Request& request, Response& response) {
+        onError(request, response);
+        return httplib::Server::HandlerResponse::Handled;
+    }));
 }
 
 void Server::Impl::onStatusPage(const httplib::Request&, httplib::Response& response) {
@@ -230,10 +240,7 @@ void Server::Impl::onPositioning(const httplib::Request& request, httplib::Respo
 
 void Server::Impl::onUpload(const httplib::Request& request, httplib::Response& response) {
     UploadRecord record;
-    record.bytes = request.body.size();
-    for (const auto& part : request.files) {
-        record.bytes += part.second.content.size();
-    }
+    record.bytes = contentLength(request);
     const auto data = request.files.find("data");
     decoder.decode(request.get_header_value("Content-Type"),
                    data != request.files.end() ? &data->second.content : nullptr, paramOf(request, "gzip") != "0",
@@ -267,20 +274,24 @@ void Server::Impl::storeUpload(UploadRecord& record) {
 }
 
 // Requests refused before a handler ran (a body over the limit, a malformed
-// multipart body, an unknown path) are logged here.
-void Server::Impl::onAnswered(const httplib::Request& request, const httplib::Response& response) {
-    if (response.status < 400 || response.has_header(kRefusalHeader)) {
+// multipart body, an unknown path) come here before their answer is written,
+// as do the handlers' own refusals, which are logged already.
+void Server::Impl::onError(const httplib::Request& request, httplib::Response& response) {
+    if (response.has_header(kRefusalHeader)) {
         return;
     }
-    log("devserver: refused " + Text::printable(request.method) + " " +
-        Text::printable(request.path).substr(0, kMaxReason) + " from " + request.remote_addr + ": HTTP " +
-        std::to_string(response.status));
-    if (request.method == "POST" && request.path.compare(0, 10, "/wifipool/") == 0) {
+    const bool upload = request.method == "POST" && request.path.compare(0, 10, "/wifipool/") == 0;
+    const std::string reason =
+        response.status == 413  ? "body larger than " + std::to_string(config.maxBodyBytes) + " bytes"
+        : response.status == 404 ? "no such endpoint"
+        : upload && response.status == 400 ? "malformed request or multipart body"
+                                           : "refused by the HTTP layer";
+    refuse(request, response, response.status, reason, "refused: " + reason + "\n", "text/plain");
+    if (upload) {
         UploadRecord record;
         record.status = response.status;
-        record.reason = response.status == 413 ? "body larger than " + std::to_string(config.maxBodyBytes) + " bytes"
-                        : response.status == 400 ? "malformed request or multipart body"
-                                                 : "refused before it was read";
+        record.reason = reason;
+        record.bytes = contentLength(request);
         std::lock_guard<std::mutex> lock(mutex);
         append(journal.uploads, std::move(record), config.journalLimit);
     }
