@@ -84,7 +84,8 @@ INSTANTIATE_TEST_SUITE_P(
     ::testing::Values(
         Query{"WeighsAccessPointsBySignal", "&wifinetworks=0000000000aa:-60,0000000000bb:-80", 200, 0, 10.0,
               20.0 + 0.001 / 11, (10 * 30 + 80) / 11.0},
-        Query{"MatchesBssidsInAnyCase", "&wifinetworks=0000000000AA:-70,00000000ffff:-40", 200, 0, 10.0, 20.0, 30},
+        Query{"MatchesBssidsInAnyCase", "&wifinetworks=0000000000AA:-70,00000000ffff:-40", 200, 0, 10.0, 20.0,
+              30},
         Query{"PrefersAccessPointsToTheCell",
               "&wifinetworks=0000000000bb:-75&lac=4021&cellid=23011&operatorid=26201&countrycode=262", 200, 0,
               10.0, 20.001, 80},
@@ -92,8 +93,8 @@ INSTANTIATE_TEST_SUITE_P(
               "&wifinetworks=00000000ffff:-50&lac=4021&cellid=23011&operatorid=26201&countrycode=262"
               "&signalstrength=-85",
               200, 0, 11, 21, 1500},
-        Query{"ReadsAnOperatorIdWithoutTheCountry", "&lac=7713&cellid=20961&operatorid=01&countrycode=250", 200,
-              0, 12, 22, 2000},
+        Query{"ReadsAnOperatorIdWithoutTheCountry", "&lac=7713&cellid=20961&operatorid=01&countrycode=250",
+              200, 0, 12, 22, 2000},
         Query{"AnswersAnErrorForUnknownRadios", "&wifinetworks=00000000ffff:-50&lac=1&cellid=2", 200, 404},
         Query{"AnswersAnErrorForNoRadios", "", 200, 404},
         Query{"RefusesAWifiEntryWithoutLevel", "&wifinetworks=0000000000aa", 400, 400},
@@ -103,8 +104,9 @@ INSTANTIATE_TEST_SUITE_P(
     [](const ::testing::TestParamInfo<Query>& info) { return std::string(info.param.name); });
 
 TEST_F(PositioningTest, RecordsWhichRadiosWereKnown) {
-    ASSERT_TRUE(get("/cellid_location/?uuid=u2&wifinetworks=0000000000aa:-60,00000000ffff:-40"
-                    "&lac=4021&cellid=23011&operatorid=26201&countrycode=262&signalstrength=-90"));
+    ASSERT_TRUE(
+        get("/cellid_location/?uuid=u2&wifinetworks=0000000000aa:-60,00000000ffff:-40"
+            "&lac=4021&cellid=23011&operatorid=26201&countrycode=262&signalstrength=-90"));
     const DevServer::Journal journal = server->journal();
     ASSERT_EQ(1u, journal.positionings.size());
     const std::vector<DevServer::SeenRadio>& radios = journal.positionings[0].radios;

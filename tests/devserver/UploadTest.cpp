@@ -53,8 +53,8 @@ protected:
                            int cut) {
         const std::string path = dataFolder + "/document";
         std::ofstream(path, std::ios::binary) << document;
-        const std::string command = std::string("python3 ") + UPLOAD_ENCODER + " " + key + " " + boundary + " " +
-                                    path + " " + std::to_string(cut);
+        const std::string command = std::string("python3 ") + UPLOAD_ENCODER + " " + key + " " + boundary +
+                                    " " + path + " " + std::to_string(cut);
         FILE* pipe = popen(command.c_str(), "r");
         EXPECT_NE(nullptr, pipe);
         std::string body;
@@ -100,7 +100,8 @@ TEST_F(UploadTest, DecodesAnUploadMadeElsewhereAndStoresIt) {
     std::string line;
     ASSERT_TRUE(std::getline(index, line));
     EXPECT_EQ(0u, line.find("upload-000001.xml\t"));
-    EXPECT_NE(std::string::npos, line.find("\t" + std::to_string(body.size()) + "\t2\tnormal,disconnected\tdev-1\tPhone & Co"))
+    EXPECT_NE(std::string::npos,
+              line.find("\t" + std::to_string(body.size()) + "\t2\tnormal,disconnected\tdev-1\tPhone & Co"))
         << line;
     ASSERT_TRUE(std::getline(index, line));
     EXPECT_EQ(0u, line.find("upload-000002.xml\t"));
@@ -162,7 +163,8 @@ TEST_P(BadUploadTest, IsRefusedLoggedAndRecorded) {
     ASSERT_EQ(1u, journal.uploads.size());
     EXPECT_FALSE(journal.uploads[0].accepted);
     EXPECT_EQ(GetParam().status, journal.uploads[0].status);
-    EXPECT_NE(std::string::npos, journal.uploads[0].reason.find(GetParam().reason)) << journal.uploads[0].reason;
+    EXPECT_NE(std::string::npos, journal.uploads[0].reason.find(GetParam().reason))
+        << journal.uploads[0].reason;
     EXPECT_FALSE(std::filesystem::exists(dataFolder + "/uploads/upload-000001.xml"));
     expectServing();
 }
@@ -194,7 +196,8 @@ INSTANTIATE_TEST_SUITE_P(
                   }},
         BadUpload{"DocumentTooLarge", 413, "document larger than 1048576 bytes",
                   [](UploadTest& test, std::string& type) {
-                      const std::string big = "<wifipool>" + std::string(2 * 1024 * 1024, ' ') + "</wifipool>";
+                      const std::string big =
+                          "<wifipool>" + std::string(2 * 1024 * 1024, ' ') + "</wifipool>";
                       return multipart(type, static_cast<BadUploadTest&>(test).encode(big));
                   }},
         BadUpload{"GzipCutShort", 400, "gzip data ends early",
@@ -206,29 +209,30 @@ INSTANTIATE_TEST_SUITE_P(
                   [](UploadTest& test, std::string& type) {
                       const std::string other = "0123456789ABCDEF012";
                       type = "multipart/form-data; boundary=" + other;
-                      return static_cast<BadUploadTest&>(test).encode(kDocument, Statistics::kUploadScrambleKey,
-                                                                      other);
+                      return static_cast<BadUploadTest&>(test).encode(kDocument,
+                                                                      Statistics::kUploadScrambleKey, other);
                   }},
         BadUpload{"NoDataPart", 400, "no \"data\" part",
                   [](UploadTest&, std::string& type) {
-                      return multipart(type, "--" + kBoundary +
-                                                 "\r\nContent-Disposition: form-data; name=\"lang\"\r\n\r\nen\r\n--" +
-                                                 kBoundary + "--\r\n");
+                      return multipart(
+                          type, "--" + kBoundary +
+                                    "\r\nContent-Disposition: form-data; name=\"lang\"\r\n\r\nen\r\n--" +
+                                    kBoundary + "--\r\n");
                   }},
         BadUpload{"MultipartNeverClosed", 400, "malformed request or multipart body",
                   [](UploadTest&, std::string& type) {
-                      return multipart(type, "--" + kBoundary +
-                                                 "\r\nContent-Disposition: form-data; name=\"data\"\r\n\r\nabc");
+                      return multipart(
+                          type,
+                          "--" + kBoundary + "\r\nContent-Disposition: form-data; name=\"data\"\r\n\r\nabc");
                   }},
         BadUpload{"NotMultipart", 415, "not a multipart/form-data body",
                   [](UploadTest&, std::string& type) {
                       type = "application/octet-stream";
                       return std::string("data");
                   }},
-        BadUpload{"BodyTooLarge", 413, "body larger than 262144 bytes",
-                  [](UploadTest&, std::string& type) {
-                      return multipart(type, std::string(300 * 1024, 'x'));
-                  }}),
+        BadUpload{
+            "BodyTooLarge", 413, "body larger than 262144 bytes",
+            [](UploadTest&, std::string& type) { return multipart(type, std::string(300 * 1024, 'x')); }}),
     [](const ::testing::TestParamInfo<BadUpload>& info) { return std::string(info.param.name); });
 
 }  // namespace

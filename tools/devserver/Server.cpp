@@ -147,7 +147,9 @@ bool Server::Impl::start(int port) {
         httplib::default_socket_options(socket);
         listening = socket;
     });
-    const int bound = port == 0 ? http->bind_to_any_port(kLoopback) : http->bind_to_port(kLoopback, port) ? port : -1;
+    const int bound = port == 0                             ? http->bind_to_any_port(kLoopback)
+                      : http->bind_to_port(kLoopback, port) ? port
+                                                            : -1;
     if (bound <= 0) {
         log("devserver: cannot listen on " + std::string(kLoopback) + ":" + std::to_string(port));
         http.reset();
@@ -183,14 +185,17 @@ void Server::Impl::route() {
     using httplib::Request;
     using httplib::Response;
     http->Get("/", [this](const Request& request, Response& response) { onStatusPage(request, response); });
-    http->Get(R"(/startup/?)", [this](const Request& request, Response& response) { onStartup(request, response); });
+    http->Get(R"(/startup/?)",
+              [this](const Request& request, Response& response) { onStartup(request, response); });
     http->Get(R"(/cellid_location/?)",
               [this](const Request& request, Response& response) { onPositioning(request, response); });
-    http->Post(R"(/wifipool/2\.x/?)", [this](const Request& request, Response& response) { onUpload(request, response); });
-    http->set_error_handler(httplib::Server::HandlerWithResponse([this](const Request& request, Response& response) {
-        onError(request, response);
-        return httplib::Server::HandlerResponse::Handled;
-    }));
+    http->Post(R"(/wifipool/2\.x/?)",
+               [this](const Request& request, Response& response) { onUpload(request, response); });
+    http->set_error_handler(
+        httplib::Server::HandlerWithResponse([this](const Request& request, Response& response) {
+            onError(request, response);
+            return httplib::Server::HandlerResponse::Handled;
+        }));
 }
 
 void Server::Impl::onStatusPage(const httplib::Request&, httplib::Response& response) {
@@ -231,8 +236,8 @@ void Server::Impl::onPositioning(const httplib::Request& request, httplib::Respo
                                  Text::formatFixed(record.accuracy, 1) + "\"/></location>\n",
                              kXml);
     } else {
-        response.set_content("<?xml version=\"1.0\"?>\n<error code=\"" + std::to_string(record.errorCode) + "\"/>\n",
-                             kXml);
+        response.set_content(
+            "<?xml version=\"1.0\"?>\n<error code=\"" + std::to_string(record.errorCode) + "\"/>\n", kXml);
     }
     std::lock_guard<std::mutex> lock(mutex);
     append(journal.positionings, std::move(record), config.journalLimit);
@@ -243,8 +248,8 @@ void Server::Impl::onUpload(const httplib::Request& request, httplib::Response& 
     record.bytes = contentLength(request);
     const auto data = request.files.find("data");
     decoder.decode(request.get_header_value("Content-Type"),
-                   data != request.files.end() ? &data->second.content : nullptr, paramOf(request, "gzip") != "0",
-                   record);
+                   data != request.files.end() ? &data->second.content : nullptr,
+                   paramOf(request, "gzip") != "0", record);
     if (record.accepted) {
         storeUpload(record);
     }
@@ -252,7 +257,8 @@ void Server::Impl::onUpload(const httplib::Request& request, httplib::Response& 
         response.set_content("ok\n", "text/plain");
     } else {
         record.reason = Text::printable(record.reason).substr(0, kMaxReason);
-        refuse(request, response, record.status, record.reason, "refused: " + record.reason + "\n", "text/plain");
+        refuse(request, response, record.status, record.reason, "refused: " + record.reason + "\n",
+               "text/plain");
     }
     std::lock_guard<std::mutex> lock(mutex);
     append(journal.uploads, std::move(record), config.journalLimit);
@@ -267,8 +273,9 @@ void Server::Impl::storeUpload(UploadRecord& record) {
         record.reason = error;
         return;
     }
-    summary("devserver: upload " + (record.storedFile.empty() ? std::string("kept in memory") : record.storedFile) +
-            ": " + std::to_string(record.chunks) + " chunks (" + joined(record.chunkTypes) + "), " +
+    summary("devserver: upload " +
+            (record.storedFile.empty() ? std::string("kept in memory") : record.storedFile) + ": " +
+            std::to_string(record.chunks) + " chunks (" + joined(record.chunkTypes) + "), " +
             std::to_string(record.accessPoints) + " access points, " + std::to_string(record.bytes) +
             " bytes, uuid " + Text::printable(record.uuid) + ", model " + Text::printable(record.model));
 }
@@ -281,11 +288,11 @@ void Server::Impl::onError(const httplib::Request& request, httplib::Response& r
         return;
     }
     const bool upload = request.method == "POST" && request.path.compare(0, 10, "/wifipool/") == 0;
-    const std::string reason =
-        response.status == 413  ? "body larger than " + std::to_string(config.maxBodyBytes) + " bytes"
-        : response.status == 404 ? "no such endpoint"
-        : upload && response.status == 400 ? "malformed request or multipart body"
-                                           : "refused by the HTTP layer";
+    const std::string reason = response.status == 413
+                                   ? "body larger than " + std::to_string(config.maxBodyBytes) + " bytes"
+                               : response.status == 404           ? "no such endpoint"
+                               : upload && response.status == 400 ? "malformed request or multipart body"
+                                                                  : "refused by the HTTP layer";
     refuse(request, response, response.status, reason, "refused: " + reason + "\n", "text/plain");
     if (upload) {
         UploadRecord record;
@@ -307,8 +314,9 @@ std::string Server::Impl::newUuid() {
     const unsigned long long high = random();
     const unsigned long long low = random();
     char text[40];
-    std::snprintf(text, sizeof(text), "%08llx-%04llx-4%03llx-%04llx-%012llx", high >> 32, (high >> 16) & 0xffff,
-                  high & 0xfff, 0x8000 | ((low >> 48) & 0x3fff), low & 0xffffffffffffull);
+    std::snprintf(text, sizeof(text), "%08llx-%04llx-4%03llx-%04llx-%012llx", high >> 32,
+                  (high >> 16) & 0xffff, high & 0xfff, 0x8000 | ((low >> 48) & 0x3fff),
+                  low & 0xffffffffffffull);
     return text;
 }
 
@@ -335,7 +343,8 @@ void Server::Impl::summary(const std::string& line) {
     summarySink(line);
 }
 
-Server::Server(Config config, std::string dataFolder) : impl(new Impl(std::move(config), std::move(dataFolder))) {}
+Server::Server(Config config, std::string dataFolder)
+    : impl(new Impl(std::move(config), std::move(dataFolder))) {}
 
 Server::~Server() {
     stop();
