@@ -24,3 +24,21 @@ TEST_F(StatusPageTest, ListsWhatArrivedWithRequestTextEscaped) {
 }
 
 }  // namespace
+
+namespace {
+
+using ServerLifecycleTest = DevServerFixture;
+
+TEST_F(ServerLifecycleTest, StartsAgainAfterStopWithItsJournal) {
+    ASSERT_TRUE(get("/startup"));
+    EXPECT_FALSE(server->start());
+    server->stop();
+    EXPECT_EQ(0, server->port());
+    ASSERT_TRUE(server->start());
+    EXPECT_EQ("http://127.0.0.1:" + std::to_string(server->port()) + "/", server->baseUrl());
+    client.reset(new httplib::Client("127.0.0.1", server->port()));
+    ASSERT_TRUE(get("/startup"));
+    EXPECT_EQ(2u, server->journal().startups.size());
+}
+
+}  // namespace

@@ -134,6 +134,20 @@ TEST_F(UploadTest, PrintsOneSummaryLinePerUpload) {
               lines[0]);
 }
 
+// In its UTF-8 mode TinyXML would take "\xE0</" for one character, so these
+// end tags would vanish and the elements nest a hundred thousand deep.
+TEST_F(UploadTest, ReadsLeadBytesBeforeEndTagsAsSingleCharacters) {
+    std::string document = "<?xml version=\"1.0\" encoding=\"UTF-8\"?><wifipool>";
+    for (int i = 0; i < 100000; ++i) {
+        document += "<a>\xE0</a>";
+    }
+    document += "</wifipool>";
+    httplib::Result result = post(encode(document));
+    ASSERT_TRUE(result);
+    EXPECT_EQ(200, result->status) << result->body;
+    expectServing();
+}
+
 struct BadUpload {
     const char* name;
     int status;

@@ -6,6 +6,7 @@
 #include <atomic>
 #include <chrono>
 #include <cstdio>
+#include <memory>
 #include <mutex>
 #include <random>
 #include <thread>
@@ -142,10 +143,11 @@ bool Server::Impl::start(int port) {
     http.reset(new httplib::Server());
     route();
     http->set_payload_max_length(config.maxBodyBytes);
-    int listening = -1;
-    http->set_socket_options([&listening](socket_t socket) {
+    // Only the listening socket is made with these options, during bind.
+    std::shared_ptr<int> listening = std::make_shared<int>(-1);
+    http->set_socket_options([listening](socket_t socket) {
         httplib::default_socket_options(socket);
-        listening = socket;
+        *listening = socket;
     });
     const int bound = port == 0                             ? http->bind_to_any_port(kLoopback)
                       : http->bind_to_port(kLoopback, port) ? port
@@ -155,8 +157,8 @@ bool Server::Impl::start(int port) {
         http.reset();
         return false;
     }
-    if (listening >= 0) {
-        ::listen(listening, kListenBacklog);
+    if (*listening >= 0) {
+        ::listen(*listening, kListenBacklog);
     }
     boundPort = bound;
     loopEnded = false;

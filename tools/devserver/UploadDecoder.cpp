@@ -173,8 +173,11 @@ bool UploadDecoder::readDocument(UploadRecord& record) const {
     if (!XmlShape::check(record.document, kMaxDepth, error)) {
         return refuse(record, kBadRequest, "not well-formed XML: " + error);
     }
+    // The collector writes windows-1251, one byte per character. Read so, TinyXML never steps
+    // over several bytes at once, which in its UTF-8 mode could swallow a '<' or a quote that the
+    // markup check saw, or step past the end of the text.
     TiXmlDocument document;
-    document.Parse(record.document.c_str());
+    document.Parse(record.document.c_str(), nullptr, TIXML_ENCODING_LEGACY);
     if (document.Error()) {
         return refuse(record, kBadRequest,
                       std::string("not well-formed XML: ") + document.ErrorDesc() + " at line " +
