@@ -5,9 +5,9 @@
 #include <set>
 
 #include "DevServerFixture.h"
-#include "support/PalTest.h"
 #include "startup/StartupData.h"
 #include "startup/impl/DefaultStartupListener.h"
+#include "support/PalTest.h"
 
 namespace {
 

@@ -181,7 +181,8 @@ private:
         cell.lac = static_cast<unsigned long>(numbers[2]);
         cell.cid = static_cast<unsigned long>(numbers[3]);
         for (const Cell& known : config.cells) {
-            if (known.mcc == cell.mcc && known.mnc == cell.mnc && known.lac == cell.lac && known.cid == cell.cid) {
+            if (known.mcc == cell.mcc && known.mnc == cell.mnc && known.lac == cell.lac &&
+                known.cid == cell.cid) {
                 return "cell " + fields[0] + " " + fields[1] + " " + fields[2] + " " + fields[3] +
                        " is listed twice";
             }

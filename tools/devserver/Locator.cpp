@@ -23,7 +23,8 @@ std::string lowerCase(const std::string& text) {
 }
 
 std::string cellName(long long mcc, long long mnc, long long lac, long long cid) {
-    return std::to_string(mcc) + "/" + std::to_string(mnc) + "/" + std::to_string(lac) + "/" + std::to_string(cid);
+    return std::to_string(mcc) + "/" + std::to_string(mnc) + "/" + std::to_string(lac) + "/" +
+           std::to_string(cid);
 }
 
 std::string parameter(const std::map<std::string, std::string>& params, const char* name) {
@@ -87,7 +88,8 @@ bool Locator::locate(const std::map<std::string, std::string>& params, Positioni
     }
     for (const SeenRadio& radio : record.radios) {
         for (const Cell& cell : config.cells) {
-            if (radio.kind == "cell" && radio.known && radio.id == cellName(cell.mcc, cell.mnc, cell.lac, cell.cid)) {
+            if (radio.kind == "cell" && radio.known &&
+                radio.id == cellName(cell.mcc, cell.mnc, cell.lac, cell.cid)) {
                 record.found = true;
                 record.latitude = cell.latitude;
                 record.longitude = cell.longitude;
@@ -168,10 +170,11 @@ bool Locator::addCell(const std::map<std::string, std::string>& params, Position
     radio.signal = static_cast<int>(signal);
     const bool numeric = Text::parseInteger(country, 0, 999, mcc) && Text::parseInteger(network, 0, 999, mnc);
     radio.id = numeric ? cellName(mcc, mnc, lac, cid)
-                       : Text::printable(country) + "/" + Text::printable(network) + "/" + std::to_string(lac) +
-                             "/" + std::to_string(cid);
+                       : Text::printable(country) + "/" + Text::printable(network) + "/" +
+                             std::to_string(lac) + "/" + std::to_string(cid);
     for (const Cell& cell : config.cells) {
-        radio.known = radio.known || (numeric && radio.id == cellName(cell.mcc, cell.mnc, cell.lac, cell.cid));
+        radio.known =
+            radio.known || (numeric && radio.id == cellName(cell.mcc, cell.mnc, cell.lac, cell.cid));
     }
     record.radios.push_back(radio);
     return true;

@@ -6,6 +6,7 @@
 #include <atomic>
 #include <chrono>
 #include <cstdio>
+#include <memory>
 #include <mutex>
 #include <random>
 #include <thread>
@@ -41,6 +42,13 @@ std::map<std::string, std::string> paramsOf(const httplib::Request& request) {
 
 std::string paramOf(const httplib::Request& request, const char* name) {
     return request.has_param(name) ? request.get_param_value(name) : std::string();
+}
+
+std::size_t contentLength(const httplib::Request& request) {
+    long long length = 0;
+    return Text::parseInteger(request.get_header_value("Content-Length"), 0, 1ll << 50, length)
+               ? static_cast<std::size_t>(length)
+               : request.body.size();
 }
 
 bool isPrintable(const std::string& text) {
@@ -109,7 +117,7 @@ private:
     void onStartup(const httplib::Request& request, httplib::Response& response);
     void onPositioning(const httplib::Request& request, httplib::Response& response);
     void onUpload(const httplib::Request& request, httplib::Response& response);
-    void onAnswered(const httplib::Request& request, const httplib::Response& response);
+    void onError(const httplib::Request& request, httplib::Response& response);
 
     void storeUpload(UploadRecord& record);
     std::string newUuid();
@@ -135,19 +143,22 @@ bool Server::Impl::start(int port) {
     http.reset(new httplib::Server());
     route();
     http->set_payload_max_length(config.maxBodyBytes);
-    int listening = -1;
-    http->set_socket_options([&listening](socket_t socket) {
+    // Only the listening socket is made with these options, during bind.
+    std::shared_ptr<int> listening = std::make_shared<int>(-1);
+    http->set_socket_options([listening](socket_t socket) {
         httplib::default_socket_options(socket);
-        listening = socket;
+        *listening = socket;
     });
-    const int bound = port == 0 ? http->bind_to_any_port(kLoopback) : http->bind_to_port(kLoopback, port) ? port : -1;
+    const int bound = port == 0                             ? http->bind_to_any_port(kLoopback)
+                      : http->bind_to_port(kLoopback, port) ? port
+                                                            : -1;
     if (bound <= 0) {
         log("devserver: cannot listen on " + std::string(kLoopback) + ":" + std::to_string(port));
         http.reset();
         return false;
     }
-    if (listening >= 0) {
-        ::listen(listening, kListenBacklog);
+    if (*listening >= 0) {
+        ::listen(*listening, kListenBacklog);
     }
     boundPort = bound;
     loopEnded = false;
@@ -176,11 +187,17 @@ void Server::Impl::route() {
     using httplib::Request;
     using httplib::Response;
     http->Get("/", [this](const Request& request, Response& response) { onStatusPage(request, response); });
-    http->Get(R"(/startup/?)", [this](const Request& request, Response& response) { onStartup(request, response); });
+    http->Get(R"(/startup/?)",
+              [this](const Request& request, Response& response) { onStartup(request, response); });
     http->Get(R"(/cellid_location/?)",
               [this](const Request& request, Response& response) { onPositioning(request, response); });
-    http->Post(R"(/wifipool/2\.x/?)", [this](const Request& request, Response& response) { onUpload(request, response); });
-    http->set_logger([this](const Request& request, const Response& response) { onAnswered(request, response); });
+    http->Post(R"(/wifipool/2\.x/?)",
+               [this](const Request& request, Response& response) { onUpload(request, response); });
+    http->set_error_handler(
+        httplib::Server::HandlerWithResponse([this](const Request& request, Response& response) {
+            onError(request, response);
+            return httplib::Server::HandlerResponse::Handled;
+        }));
 }
 
 void Server::Impl::onStatusPage(const httplib::Request&, httplib::Response& response) {
@@ -221,8 +238,8 @@ void Server::Impl::onPositioning(const httplib::Request& request, httplib::Respo
                                  Text::formatFixed(record.accuracy, 1) + "\"/></location>\n",
                              kXml);
     } else {
-        response.set_content("<?xml version=\"1.0\"?>\n<error code=\"" + std::to_string(record.errorCode) + "\"/>\n",
-                             kXml);
+        response.set_content(
+            "<?xml version=\"1.0\"?>\n<error code=\"" + std::to_string(record.errorCode) + "\"/>\n", kXml);
     }
     std::lock_guard<std::mutex> lock(mutex);
     append(journal.positionings, std::move(record), config.journalLimit);
@@ -230,14 +247,11 @@ void Server::Impl::onPositioning(const httplib::Request& request, httplib::Respo
 
 void Server::Impl::onUpload(const httplib::Request& request, httplib::Response& response) {
     UploadRecord record;
-    record.bytes = request.body.size();
-    for (const auto& part : request.files) {
-        record.bytes += part.second.content.size();
-    }
+    record.bytes = contentLength(request);
     const auto data = request.files.find("data");
     decoder.decode(request.get_header_value("Content-Type"),
-                   data != request.files.end() ? &data->second.content : nullptr, paramOf(request, "gzip") != "0",
-                   record);
+                   data != request.files.end() ? &data->second.content : nullptr,
+                   paramOf(request, "gzip") != "0", record);
     if (record.accepted) {
         storeUpload(record);
     }
@@ -245,7 +259,8 @@ void Server::Impl::onUpload(const httplib::Request& request, httplib::Response& 
         response.set_content("ok\n", "text/plain");
     } else {
         record.reason = Text::printable(record.reason).substr(0, kMaxReason);
-        refuse(request, response, record.status, record.reason, "refused: " + record.reason + "\n", "text/plain");
+        refuse(request, response, record.status, record.reason, "refused: " + record.reason + "\n",
+               "text/plain");
     }
     std::lock_guard<std::mutex> lock(mutex);
     append(journal.uploads, std::move(record), config.journalLimit);
@@ -260,27 +275,32 @@ void Server::Impl::storeUpload(UploadRecord& record) {
         record.reason = error;
         return;
     }
-    summary("devserver: upload " + (record.storedFile.empty() ? std::string("kept in memory") : record.storedFile) +
-            ": " + std::to_string(record.chunks) + " chunks (" + joined(record.chunkTypes) + "), " +
+    summary("devserver: upload " +
+            (record.storedFile.empty() ? std::string("kept in memory") : record.storedFile) + ": " +
+            std::to_string(record.chunks) + " chunks (" + joined(record.chunkTypes) + "), " +
             std::to_string(record.accessPoints) + " access points, " + std::to_string(record.bytes) +
             " bytes, uuid " + Text::printable(record.uuid) + ", model " + Text::printable(record.model));
 }
 
 // Requests refused before a handler ran (a body over the limit, a malformed
-// multipart body, an unknown path) are logged here.
-void Server::Impl::onAnswered(const httplib::Request& request, const httplib::Response& response) {
-    if (response.status < 400 || response.has_header(kRefusalHeader)) {
+// multipart body, an unknown path) come here before their answer is written,
+// as do the handlers' own refusals, which are logged already.
+void Server::Impl::onError(const httplib::Request& request, httplib::Response& response) {
+    if (response.has_header(kRefusalHeader)) {
         return;
     }
-    log("devserver: refused " + Text::printable(request.method) + " " +
-        Text::printable(request.path).substr(0, kMaxReason) + " from " + request.remote_addr + ": HTTP " +
-        std::to_string(response.status));
-    if (request.method == "POST" && request.path.compare(0, 10, "/wifipool/") == 0) {
+    const bool upload = request.method == "POST" && request.path.compare(0, 10, "/wifipool/") == 0;
+    const std::string reason = response.status == 413
+                                   ? "body larger than " + std::to_string(config.maxBodyBytes) + " bytes"
+                               : response.status == 404           ? "no such endpoint"
+                               : upload && response.status == 400 ? "malformed request or multipart body"
+                                                                  : "refused by the HTTP layer";
+    refuse(request, response, response.status, reason, "refused: " + reason + "\n", "text/plain");
+    if (upload) {
         UploadRecord record;
         record.status = response.status;
-        record.reason = response.status == 413 ? "body larger than " + std::to_string(config.maxBodyBytes) + " bytes"
-                        : response.status == 400 ? "malformed request or multipart body"
-                                                 : "refused before it was read";
+        record.reason = reason;
+        record.bytes = contentLength(request);
         std::lock_guard<std::mutex> lock(mutex);
         append(journal.uploads, std::move(record), config.journalLimit);
     }
@@ -296,8 +316,9 @@ std::string Server::Impl::newUuid() {
     const unsigned long long high = random();
     const unsigned long long low = random();
     char text[40];
-    std::snprintf(text, sizeof(text), "%08llx-%04llx-4%03llx-%04llx-%012llx", high >> 32, (high >> 16) & 0xffff,
-                  high & 0xfff, 0x8000 | ((low >> 48) & 0x3fff), low & 0xffffffffffffull);
+    std::snprintf(text, sizeof(text), "%08llx-%04llx-4%03llx-%04llx-%012llx", high >> 32,
+                  (high >> 16) & 0xffff, high & 0xfff, 0x8000 | ((low >> 48) & 0x3fff),
+                  low & 0xffffffffffffull);
     return text;
 }
 
@@ -324,7 +345,8 @@ void Server::Impl::summary(const std::string& line) {
     summarySink(line);
 }
 
-Server::Server(Config config, std::string dataFolder) : impl(new Impl(std::move(config), std::move(dataFolder))) {}
+Server::Server(Config config, std::string dataFolder)
+    : impl(new Impl(std::move(config), std::move(dataFolder))) {}
 
 Server::~Server() {
     stop();

@@ -31,8 +31,8 @@ std::string startupRow(const StartupRecord& record) {
 std::string positioningRow(const PositioningRecord& record) {
     std::string radios;
     for (const SeenRadio& radio : record.radios) {
-        radios += (radios.empty() ? "" : ", ") + radio.kind + " " + radio.id + " " + std::to_string(radio.signal) +
-                  (radio.known ? " (known)" : " (unknown)");
+        radios += (radios.empty() ? "" : ", ") + radio.kind + " " + radio.id + " " +
+                  std::to_string(radio.signal) + (radio.known ? " (known)" : " (unknown)");
     }
     const std::string answer =
         record.found ? Text::formatFixed(record.latitude, 6) + ", " + Text::formatFixed(record.longitude, 6) +
@@ -46,8 +46,9 @@ std::string uploadRow(const UploadRecord& record) {
     for (const std::string& type : record.chunkTypes) {
         types += (types.empty() ? "" : ", ") + type;
     }
-    const std::string outcome = record.accepted ? "stored " + (record.storedFile.empty() ? "(in memory)" : record.storedFile)
-                                                : "refused " + std::to_string(record.status) + ": " + record.reason;
+    const std::string outcome =
+        record.accepted ? "stored " + (record.storedFile.empty() ? "(in memory)" : record.storedFile)
+                        : "refused " + std::to_string(record.status) + ": " + record.reason;
     return row(cell(outcome) + cell(std::to_string(record.bytes)) + cell(record.uuid) + cell(record.model) +
                cell(std::to_string(record.chunks) + (types.empty() ? "" : " (" + types + ")")) +
                cell(std::to_string(record.accessPoints)));
@@ -80,8 +81,9 @@ std::string StatusPage::render(const Journal& journal, const std::string& baseUr
     page += header("Positioning queries", journal.positionings.size(),
                    "<th>uuid</th><th>radios</th><th>answer</th>");
     page += rows(journal.positionings, &positioningRow);
-    page += header("Uploads", journal.uploads.size(),
-                   "<th>outcome</th><th>bytes</th><th>uuid</th><th>model</th><th>chunks</th><th>access points</th>");
+    page += header(
+        "Uploads", journal.uploads.size(),
+        "<th>outcome</th><th>bytes</th><th>uuid</th><th>model</th><th>chunks</th><th>access points</th>");
     page += rows(journal.uploads, &uploadRow);
     return page + "</body></html>\n";
 }

@@ -76,7 +76,8 @@ void UploadDecoder::decode(const std::string& contentType, const std::string* pa
             return;
         }
     } else if (data.size() > maxDocumentBytes) {
-        refuse(record, kPayloadTooLarge, "document larger than " + std::to_string(maxDocumentBytes) + " bytes");
+        refuse(record, kPayloadTooLarge,
+               "document larger than " + std::to_string(maxDocumentBytes) + " bytes");
         return;
     } else {
         record.document = data;
@@ -114,7 +115,8 @@ bool UploadDecoder::boundaryOf(const std::string& contentType, std::string& boun
 
 void UploadDecoder::unscramble(std::string& data) {
     for (std::size_t i = 0; i < data.size(); ++i) {
-        data[i] = static_cast<char>(data[i] ^ Statistics::kUploadScrambleKey[i % Statistics::kUploadScrambleKeyLength]);
+        data[i] = static_cast<char>(data[i] ^
+                                    Statistics::kUploadScrambleKey[i % Statistics::kUploadScrambleKeyLength]);
     }
 }
 
@@ -156,8 +158,9 @@ bool UploadDecoder::gunzip(const std::string& data, std::string& document, Uploa
             return refuse(record, kBadRequest, "gzip data ends early");
         }
         if (result != Z_OK) {
-            return refuse(record, kBadRequest,
-                          std::string("corrupt gzip data: ") + (stream.msg != nullptr ? stream.msg : "unknown"));
+            return refuse(
+                record, kBadRequest,
+                std::string("corrupt gzip data: ") + (stream.msg != nullptr ? stream.msg : "unknown"));
         }
     }
 }
@@ -170,12 +173,16 @@ bool UploadDecoder::readDocument(UploadRecord& record) const {
     if (!XmlShape::check(record.document, kMaxDepth, error)) {
         return refuse(record, kBadRequest, "not well-formed XML: " + error);
     }
+    // The collector writes windows-1251, one byte per character. Read so, TinyXML never steps
+    // over several bytes at once, which in its UTF-8 mode could swallow a '<' or a quote that the
+    // markup check saw, or step past the end of the text.
     TiXmlDocument document;
-    document.Parse(record.document.c_str());
+    document.Parse(record.document.c_str(), nullptr, TIXML_ENCODING_LEGACY);
     if (document.Error()) {
         return refuse(record, kBadRequest,
                       std::string("not well-formed XML: ") + document.ErrorDesc() + " at line " +
-                          std::to_string(document.ErrorRow()) + ", column " + std::to_string(document.ErrorCol()));
+                          std::to_string(document.ErrorRow()) + ", column " +
+                          std::to_string(document.ErrorCol()));
     }
     const TiXmlElement* root = document.RootElement();
     if (root == nullptr || root->ValueStr() != "wifipool") {

@@ -147,7 +147,9 @@ private:
         return true;
     }
 
-    bool starts(const char* prefix) const { return text.compare(pos, std::char_traits<char>::length(prefix), prefix) == 0; }
+    bool starts(const char* prefix) const {
+        return text.compare(pos, std::char_traits<char>::length(prefix), prefix) == 0;
+    }
 
     bool fail(const std::string& what) {
         error = what;

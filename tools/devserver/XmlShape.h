@@ -12,7 +12,9 @@ namespace DevServer {
 // start tags with quoted attribute values, end tags) with an explicit stack
 // and refuses anything else, such as a DOCTYPE, where the two could disagree
 // on where markup ends. Text it accepts nests no deeper than maxDepth in
-// TinyXML either. Any thread.
+// TinyXML either, when TinyXML reads it one byte per character
+// (TIXML_ENCODING_LEGACY): in its UTF-8 mode TinyXML steps over a lead byte's
+// whole sequence, '<' and quotes included. Any thread.
 class XmlShape {
 public:
     static bool check(const std::string& text, std::size_t maxDepth, std::string& error);
