@@ -7,7 +7,6 @@
 // answer reaches the library at the same virtual instant as in any other run:
 // the outcome does not depend on how fast the machine is.
 #include <boost/make_shared.hpp>
-#include <cmath>
 #include <filesystem>
 #include <fstream>
 #include <iterator>
@@ -32,18 +31,15 @@ const KDust kStepMs = 100;
 const int kIdlePumps = 10;
 const pal::CellInfo kTunnelCell = {true, 23011, 4021, "26201", "262"};
 
-// Positions and precisions the application hears.
+// The positions the application hears.
 class Positions : public Location::LocationListener {
 public:
     void onLocationChanged(Location::LocationManager*, const Location::Location& location) override {
         heard.push_back(location);
     }
     void onLocationPrecisionChanged(Location::LocationManager*, Location::LocationPrecision,
-                                    Location::LocationPrecision newPrecision) override {
-        precisions.push_back(newPrecision);
-    }
+                                    Location::LocationPrecision) override {}
     std::vector<Location::Location> heard;
-    std::vector<int> precisions;
 };
 
 class EndToEndTest : public PalTest {
