@@ -45,6 +45,7 @@ float wrapLongitude(float longitude) {
 // Standing fixes are not moved and average as before. A fix that moves
 // without saying where, or across a long gap, ends the carrying: it and older
 // fixes are left out.
+//
 // Sums run over offsets from the newest fix, which single precision keeps
 // exactly, rather than over whole latitudes.
 Location LocationFilterAveragePosition::filter(const Location& location) {
