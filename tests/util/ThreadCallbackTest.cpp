@@ -36,6 +36,9 @@ public:
 
     void onCall(Context context) {
         contexts.push_back(context.get());
+        // Read now: the call releases its context, so the pointer above is only an identity.
+        const NumberContext* numbered = dynamic_cast<const NumberContext*>(context.get());
+        numbers.push_back(numbered != nullptr ? numbered->number : -1);
         threads.push_back(kdThreadSelf());
         if (destroyOnCall) {
             threadCallback.reset();
@@ -54,6 +57,7 @@ public:
 
     boost::scoped_ptr<Util::ThreadCallback> threadCallback;
     std::vector<Util::ThreadCallback::Context*> contexts;
+    std::vector<int> numbers;
     std::vector<KDThread*> threads;
     bool destroyOnCall = false;
     KDThread* postedFrom = nullptr;
@@ -107,7 +111,7 @@ TEST_F(ThreadCallbackTest, CallsFromAWorkerRunLaterOnTheOwnerInPostingOrderAndRe
     pump();
     ASSERT_EQ(51u, receiver.contexts.size());
     for (int i = 0; i < 50; ++i) {
-        EXPECT_EQ(i, static_cast<NumberContext*>(receiver.contexts[i])->number);
+        EXPECT_EQ(i, receiver.numbers[i]);
         EXPECT_EQ(kdThreadSelf(), receiver.threads[i]);
     }
     EXPECT_EQ(nullptr, receiver.contexts[50]);
