@@ -21,7 +21,7 @@ bash scripts/install-deps.sh
 HOST_PACKAGES=(crossbuild-essential-"$ARCH" qemu-user)
 TARGET_PACKAGES=(
   libboost-dev zlib1g-dev libminizip-dev libtinyxml-dev libprotobuf-dev
-  libpng-dev libjpeg-dev libogg-dev libspeex-dev libvorbis-dev libopenal-dev
+  libpng-dev libjpeg-dev libogg-dev libspeex-dev libvorbis-dev libopenal-dev libasound2
   libgles-dev libegl-dev libegl-mesa0 libgl1-mesa-dri
   libcurl4-openssl-dev libcpp-httplib-dev
   libgtest-dev libgmock-dev
