@@ -7,6 +7,16 @@
 // SVG per track (truth, raw fixes, both filtered tracks) to a folder it
 // prints. Then times the filters per fix against building the raw record,
 // the work every fix costs without them.
+//
+// The target is filtered RMS error at most 60 % of raw while standing and no
+// worse than raw while driving. The Kalman filter meets it on these tracks.
+// The satellite provider's chain meets it while driving, but not while
+// standing (64-76 % of raw with independent noise, 85-102 % with correlated
+// noise, over six seeds): its minimum-distance stage holds one raw fix for as
+// long as the following ones stay within half the accuracy of it, so the held
+// position is as far off as that one fix, and a mean over 3 fixes cannot take
+// out noise that is correlated over 5 s. That stage and the window are what
+// keep the marker still, and are kept as they are.
 #include <benchmark/benchmark.h>
 #include <pal/Simulation.h>
 #include <stdlib.h>
@@ -39,6 +49,7 @@ struct Sample {
 
 struct Track {
     std::string name;
+    std::string file;  // SVG file name without the noise suffix
     std::vector<Sample> truth;
     std::vector<Location::Location> raw;
 };
@@ -117,11 +128,12 @@ void displace(Location::Location& fix, double metres, double azimuth) {
     fix.initFromRaw();
 }
 
-Track makeTrack(const char* name, const std::vector<Sample>& truth, Noise noise, double correlation,
-                unsigned seed) {
+Track makeTrack(const char* name, const char* file, const std::vector<Sample>& truth, Noise noise,
+                double correlation, unsigned seed) {
     noise.correlationSeconds = correlation;
     Track track;
     track.name = name;
+    track.file = file;
     track.truth = truth;
     track.raw = observe(truth, noise, seed);
     return track;
@@ -131,13 +143,13 @@ std::vector<Track> makeTracks(double correlation) {
     const double lat = 52.5163;
     const double lon = 13.3777;
     std::vector<Track> tracks;
-    tracks.push_back(makeTrack("standing", followLegs(lat, lon, {{300, 0.0, 0.0}}),
+    tracks.push_back(makeTrack("standing", "standing", followLegs(lat, lon, {{300, 0.0, 0.0}}),
                                {5.0, 20.0f, 0.3, -1.0, 0.0}, correlation, 1));
     tracks.push_back(makeTrack(
-        "walking",
+        "walking", "walking",
         followLegs(lat, lon, {{120, 1.4, 20.0}, {90, 1.4, 110.0}, {150, 1.4, 200.0}, {60, 1.4, 290.0}}),
         {4.0, 10.0f, 0.3, 12.0, 0.0}, correlation, 2));
-    tracks.push_back(makeTrack("driving with turns",
+    tracks.push_back(makeTrack("driving with turns", "driving",
                                followLegs(lat, lon,
                                           {{40, 14.0, 90.0},
                                            {5, 6.0, 135.0},
@@ -149,9 +161,9 @@ std::vector<Track> makeTracks(double correlation) {
                                            {5, 6.0, 45.0},
                                            {40, 15.0, 90.0}}),
                                {3.0, 8.0f, 0.5, 3.0, 0.0}, correlation, 3));
-    Track outliers =
-        makeTrack("walking, 150 m outliers", followLegs(lat, lon, {{200, 1.4, 45.0}, {100, 1.4, 135.0}}),
-                  {4.0, 10.0f, 0.3, 12.0, 0.0}, correlation, 4);
+    Track outliers = makeTrack("walking, 150 m outliers", "outliers",
+                               followLegs(lat, lon, {{200, 1.4, 45.0}, {100, 1.4, 135.0}}),
+                               {4.0, 10.0f, 0.3, 12.0, 0.0}, correlation, 4);
     displace(outliers.raw[80], 150.0, 300.0);
     displace(outliers.raw[220], 150.0, 30.0);
     tracks.push_back(outliers);
@@ -184,23 +196,30 @@ struct Quality {
     int moving = 0;
 };
 
+// A dropped fix leaves the last position on the map, so it counts as that
+// position at the dropped fix's time: dropping hard fixes cannot flatter a
+// filter.
 Quality measure(const Track& track, const std::vector<Location::Location>& out) {
     Quality q;
     double positionSum = 0.0;
     double courseSum = 0.0;
     int positions = 0;
+    const Location::Location* shown = nullptr;
     for (size_t i = 0; i < out.size(); ++i) {
-        if (out[i].accuracy < 0.0f) {
+        if (out[i].accuracy >= 0.0f) {
+            shown = &out[i];
+        }
+        if (shown == nullptr) {
             continue;
         }
         double metres;
-        earth().Inverse(track.truth[i].lat, track.truth[i].lon, out[i].latitude, out[i].longitude, metres);
+        earth().Inverse(track.truth[i].lat, track.truth[i].lon, shown->latitude, shown->longitude, metres);
         positionSum += metres * metres;
         ++positions;
         if (track.truth[i].speed > 0.5) {
             ++q.moving;
-            if (out[i].bearing >= 0.0f) {
-                const double d = angleDifference(out[i].bearing, track.truth[i].course);
+            if (shown->bearing >= 0.0f) {
+                const double d = angleDifference(shown->bearing, track.truth[i].course);
                 courseSum += d * d;
                 ++q.courseCount;
             }
@@ -343,7 +362,7 @@ void printQualityTable(const std::string& folder, const char* noiseName, double 
                     raw.rmsPosition, c.rmsPosition, k.rmsPosition, 100.0 * c.rmsPosition / raw.rmsPosition,
                     100.0 * k.rmsPosition / raw.rmsPosition, courseText(raw).c_str(), courseText(c).c_str(),
                     courseText(k).c_str());
-        std::string file = track.name.substr(0, track.name.find_first_of(" ,"));
+        std::string file = track.file;
         file += correlation > 0.0 ? "-correlated.svg" : "-independent.svg";
         char caption[160];
         std::snprintf(caption, sizeof(caption), "%s noise; RMS error raw %.1f m, chain %.1f m, Kalman %.1f m",

@@ -8,7 +8,7 @@ PACKAGES=(
   libboost-dev zlib1g-dev libminizip-dev libtinyxml-dev
   libprotobuf-dev protobuf-compiler
   libpng-dev libjpeg-dev libjpeg-turbo-progs
-  libogg-dev libspeex-dev libvorbis-dev libopenal-dev speex vorbis-tools
+  libogg-dev libspeex-dev libvorbis-dev libopenal-dev libasound2 speex vorbis-tools
   libgles-dev libegl-dev libegl-mesa0 libgl1-mesa-dri
   libcurl4-openssl-dev libcpp-httplib-dev
   libgtest-dev libgmock-dev libbenchmark-dev

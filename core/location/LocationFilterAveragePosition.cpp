@@ -1,5 +1,6 @@
 #include "location/LocationFilterAveragePosition.h"
 
+#include "location/impl/Motion.h"
 #include "math/CoordConversion.h"
 
 namespace Location {
@@ -7,27 +8,88 @@ namespace Location {
 namespace {
 
 const size_t kWindowSize = 3;
+// Carrying a fix further than this across a gap guesses more than it knows.
+const float kMaxCarrySeconds = 5.0f;
+
+// A fix without a speed is averaged where it stands, as it always was: a
+// receiver that never reports speed gives nothing to carry its fixes by.
+bool carryingVelocity(const Location& fix, float& east, float& north) {
+    if (fix.speed < 0.0f) {
+        east = 0.0f;
+        north = 0.0f;
+        return true;
+    }
+    return Motion::velocity(fix, east, north);
+}
+
+// The shorter way round, so that fixes either side of the date line average
+// next to it rather than at the far side of the world.
+float longitudeDifference(float from, float to) {
+    const float difference = to - from;
+    if (difference > 180.0f) {
+        return difference - 360.0f;
+    }
+    return difference < -180.0f ? difference + 360.0f : difference;
+}
+
+float wrapLongitude(float longitude) {
+    return longitudeDifference(0.0f, longitude);
+}
 
 }  // namespace
 
+// A plain mean of the last fixes trails a moving receiver by a fix or more (14
+// m at city driving speed). So each older fix is first carried forward to the
+// newest one's time along the velocities the fixes report, between each two
+// fixes by the mean of their velocities so that a turn between them is shared.
+// Standing fixes are not moved and average as before. A fix that moves
+// without saying where, or across a long gap, ends the carrying: it and older
+// fixes are left out.
+//
+// Sums run over offsets from the newest fix, which single precision keeps
+// exactly, rather than over whole latitudes.
 Location LocationFilterAveragePosition::filter(const Location& location) {
     window.push_back(location);
     while (window.size() > kWindowSize) {
         window.pop_front();
     }
-    float latitudeSum = 0.0f;
-    float longitudeSum = 0.0f;
-    float altitudeSum = 0.0f;
-    for (size_t i = 0; i < window.size(); ++i) {
-        latitudeSum += window[i].latitude;
-        longitudeSum += window[i].longitude;
-        altitudeSum += window[i].altitude;
+    const Location& newest = window.back();
+    float latitudePerMetre, longitudePerMetre;
+    Motion::degreesPerMetre(newest.latitude, latitudePerMetre, longitudePerMetre);
+    float latitudeOffset = 0.0f;
+    float longitudeOffset = 0.0f;
+    float altitudeSum = newest.altitude;
+    size_t count = 1;
+    float carriedEast = 0.0f;
+    float carriedNorth = 0.0f;
+    float laterEast, laterNorth;
+    const bool newestKnown = carryingVelocity(newest, laterEast, laterNorth);
+    for (size_t i = window.size() - 1; newestKnown && i-- > 0;) {
+        const Location& older = window[i];
+        float east, north;
+        if (!carryingVelocity(older, east, north)) {
+            break;
+        }
+        const float seconds = Motion::secondsBetween(older, window[i + 1]);
+        const bool moved = east != 0.0f || north != 0.0f || laterEast != 0.0f || laterNorth != 0.0f;
+        if (moved && seconds > kMaxCarrySeconds) {
+            break;
+        }
+        carriedEast += 0.5f * (east + laterEast) * seconds;
+        carriedNorth += 0.5f * (north + laterNorth) * seconds;
+        latitudeOffset += older.latitude - newest.latitude + carriedNorth * latitudePerMetre;
+        longitudeOffset +=
+            longitudeDifference(newest.longitude, older.longitude) + carriedEast * longitudePerMetre;
+        altitudeSum += older.altitude;
+        ++count;
+        laterEast = east;
+        laterNorth = north;
     }
-    const float count = static_cast<float>(window.size());
+    const float n = static_cast<float>(count);
     Location averaged = location;
-    averaged.latitude = latitudeSum / count;
-    averaged.longitude = longitudeSum / count;
-    averaged.altitude = altitudeSum / count;
+    averaged.latitude = newest.latitude + latitudeOffset / n;
+    averaged.longitude = wrapLongitude(newest.longitude + longitudeOffset / n);
+    averaged.altitude = altitudeSum / n;
     CoordConversion::toXY(averaged.latitude, averaged.longitude, averaged.x, averaged.y);
     return averaged;
 }

@@ -6,7 +6,8 @@
 
 namespace Location {
 
-// Replaces the position and altitude by their mean over the last 3 fixes.
+// Replaces the position and altitude by their mean over the last 3 fixes,
+// the older ones carried forward along the velocities the fixes report.
 class LocationFilterAveragePosition : public LocationFilter {
 public:
     Location filter(const Location& location) override;

@@ -1,15 +1,19 @@
 #include "location/LocationFilterKalman.h"
 
 #include "location/LocationFilterComplex.h"
-#include "location/impl/BearingMath.h"
+#include "location/impl/Motion.h"
 #include "math/CoordConversion.h"
 
 namespace Location {
 
 namespace {
 
-const float kPositionNoiseMetres = 20.0f;
 const float kAltitudeNoiseFactor = 20.0f;
+// A receiver's accuracy is the radius within which the true position lies
+// with 68 % probability: 1.5 standard deviations of a round Gaussian error.
+const float kAccuracyPerSigma = 1.5f;
+// What a reported speed and bearing may be off by, in metres per second.
+const float kMotionNoise = 0.5f;
 
 bool isValid(const Location& location) {
     return location.accuracy >= 0.0f && location.precision != PrecisionNone;
@@ -41,6 +45,12 @@ KDint32 toWorld(double value) {
         return -0x7FFFFFFF - 1;
     }
     return static_cast<KDint32>(value);
+}
+
+// A variance of at least one world unit squared keeps the gain invertible
+// for fixes that claim perfect accuracy.
+float atLeastOne(float variance) {
+    return variance > 1.0f ? variance : 1.0f;
 }
 
 Matrix diagonal(float a, float b, float c, float d) {
@@ -77,7 +87,7 @@ Location LocationFilterKalman::filter(const Location& location) {
     if (!isValid(lastAccepted)) {
         originX = location.x;
         originY = location.y;
-        start(measurementOf(location));
+        start(location);
     } else {
         update(location, measurementOf(location));
     }
@@ -86,7 +96,7 @@ Location LocationFilterKalman::filter(const Location& location) {
     if (!isFinite(estimate)) {
         originX = location.x;
         originY = location.y;
-        start(measurementOf(location));
+        start(location);
     }
     lastAccepted = location;
     return adjustLocation(location);
@@ -97,22 +107,32 @@ LocationFilterKalman::Vector LocationFilterKalman::measurementOf(const Location&
                   static_cast<float>(static_cast<double>(fix.y) - originY), fix.altitude);
 }
 
-void LocationFilterKalman::start(const Vector& measurement) {
+// The first fix is known as well as its accuracy says, not better: the
+// covariance starts from its measurement noise.
+void LocationFilterKalman::start(const Location& fix) {
+    R = measurementNoise(fix);
     const Matrix inverseH = H.getInverse();
-    estimate = times(inverseH, measurement);
+    estimate = times(inverseH, measurementOf(fix));
     P = inverseH * R * H.getTranspose().getInverse();
 }
 
-void LocationFilterKalman::update(const Location& fix, const Vector& measurement) {
-    int metresXY = 0;
-    CoordConversion::MtoXY(fix.latitude, kPositionNoiseMetres, metresXY);
-    const float a = fix.accuracy;
-    R = diagonal(a * metresXY, a * metresXY, a * kAltitudeNoiseFactor, 1.0f);
-    const Vector previous = measurementOf(lastAccepted);
-    Q = diagonal(kdFabsf(measurement.x - previous.x), kdFabsf(measurement.y - previous.y),
-                 kdFabsf(measurement.z - previous.z), 1.0f);
+// Noise as variances in world units squared, from the fix's accuracy; the
+// altitude keeps its own, coarser model.
+Matrix LocationFilterKalman::measurementNoise(const Location& fix) const {
+    int sigma = 0;
+    CoordConversion::MtoXY(fix.latitude, fix.accuracy / kAccuracyPerSigma, sigma);
+    const float variance = atLeastOne(static_cast<float>(sigma) * static_cast<float>(sigma));
+    return diagonal(variance, variance, fix.accuracy * kAltitudeNoiseFactor, 1.0f);
+}
 
-    const Vector predicted = plus(times(F, estimate), times(B, controlOf(fix)));
+void LocationFilterKalman::update(const Location& fix, const Vector& measurement) {
+    const Step step = stepSinceLast(fix);
+    R = measurementNoise(fix);
+    const float variance = step.uncertainty * step.uncertainty;
+    const Vector previous = measurementOf(lastAccepted);
+    Q = diagonal(variance, variance, kdFabsf(measurement.z - previous.z), 1.0f);
+
+    const Vector predicted = plus(times(F, estimate), times(B, step.displacement));
     const Matrix predictedP = F * P * F.getTranspose() + Q;
     const Matrix gain = predictedP * H.getTranspose() * (H * predictedP * H.getTranspose() + R).getInverse();
     const Vector innovation = measurement - times(H, predicted);
@@ -120,21 +140,60 @@ void LocationFilterKalman::update(const Location& fix, const Vector& measurement
     P = predictedP - gain * H * predictedP;
 }
 
-LocationFilterKalman::Vector LocationFilterKalman::controlOf(const Location& fix) const {
-    if (fix.speedXY < 0 || fix.bearing < 0.0f) {
-        return Vector();
+// The prediction moves the estimate by the mean of the velocities the two
+// fixes report (a turn between them is shared by both courses); its
+// uncertainty grows with the receiver's speed and bearing noise and with the
+// change of velocity between the fixes, or, when the fix says nothing about
+// where it goes, with the distance it could have covered.
+LocationFilterKalman::Step LocationFilterKalman::stepSinceLast(const Location& fix) const {
+    const float seconds = secondsSinceLast(fix);
+    int noise = 0;
+    CoordConversion::vMtovXY(fix.latitude, kMotionNoise, noise);
+    float vx, vy, lastVx, lastVy;
+    const bool known = Motion::velocityXY(fix, vx, vy);
+    const bool lastKnown = Motion::velocityXY(lastAccepted, lastVx, lastVy);
+    float change;
+    Step step;
+    if (known && lastKnown) {
+        step.displacement = Vector(0.5f * (vx + lastVx) * seconds, 0.5f * (vy + lastVy) * seconds, 0.0f);
+        change = 0.5f * kdSqrtf((vx - lastVx) * (vx - lastVx) + (vy - lastVy) * (vy - lastVy));
+    } else if (known) {
+        step.displacement = Vector(vx * seconds, vy * seconds, 0.0f);
+        change = kdSqrtf(vx * vx + vy * vy);
+    } else {
+        int reach = 0;
+        CoordConversion::vMtovXY(fix.latitude,
+                                 fix.speed > Motion::kWalkingPace ? fix.speed : Motion::kWalkingPace, reach);
+        change = static_cast<float>(reach);
     }
-    const float seconds = static_cast<float>(fix.fixTime - lastAccepted.fixTime) / 1000.0f;
-    const float distance = static_cast<float>(fix.speedXY) * seconds;
-    const float radians = BearingMath::degreesToRadians(fix.bearing);
-    return Vector(distance * kdSinf(radians), -distance * kdCosf(radians), 0.0f);
+    step.uncertainty = (static_cast<float>(noise) + change) * seconds;
+    return step;
 }
 
+// The fixes' own time stamps (milliseconds) when both carry one, else the
+// time they were received.
+float LocationFilterKalman::secondsSinceLast(const Location& fix) const {
+    if (fix.fixTime > 0 && lastAccepted.fixTime > 0 && fix.fixTime > lastAccepted.fixTime) {
+        return static_cast<float>(fix.fixTime - lastAccepted.fixTime) / 1000.0f;
+    }
+    return Motion::secondsBetween(lastAccepted, fix);
+}
+
+// Latitude and longitude move from the fix's own by the estimate's offset
+// from it: a round trip of the whole position through single-precision world
+// coordinates would add a metre or more of rounding.
 Location LocationFilterKalman::adjustLocation(const Location& fix) const {
     Location adjusted = fix;
     adjusted.x = toWorld(static_cast<double>(originX) + estimate.x);
     adjusted.y = toWorld(static_cast<double>(originY) + estimate.y);
-    CoordConversion::toLL(adjusted.x, adjusted.y, adjusted.latitude, adjusted.longitude);
+    const Vector offset = estimate - measurementOf(fix);
+    float metresPerUnit = 0.0f;
+    CoordConversion::XYtoM(fix.latitude, 1000000, metresPerUnit);
+    metresPerUnit /= 1.0e6f;
+    float latitudePerMetre, longitudePerMetre;
+    Motion::degreesPerMetre(fix.latitude, latitudePerMetre, longitudePerMetre);
+    adjusted.latitude = fix.latitude - offset.y * metresPerUnit * latitudePerMetre;
+    adjusted.longitude = fix.longitude + offset.x * metresPerUnit * longitudePerMetre;
     adjusted.altitude = estimate.z;
     return adjusted;
 }

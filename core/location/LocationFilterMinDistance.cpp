@@ -1,5 +1,6 @@
 #include "location/LocationFilterMinDistance.h"
 
+#include "location/impl/Motion.h"
 #include "math/CoordConversion.h"
 
 namespace Location {
@@ -14,7 +15,9 @@ Location LocationFilterMinDistance::filter(const Location& location) {
     }
     const float distance =
         CoordConversion::getDistance(lastLatitude, lastLongitude, location.latitude, location.longitude);
-    if (0.5f * location.accuracy < distance) {
+    // A fix that reports moving along a bearing has not jittered away, it
+    // has gone there: holding it back would make the position trail behind.
+    if (0.5f * location.accuracy < distance || Motion::isMoving(location)) {
         lastLatitude = location.latitude;
         lastLongitude = location.longitude;
         return location;

@@ -6,6 +6,7 @@
 #include <climits>
 #include <cstdlib>
 #include <cstring>
+#include <string>
 
 #include "io/ByteArrayInputStream.h"
 #include "io/zip/GzipInputStream.h"
@@ -172,6 +173,76 @@ bool nestsDeeperThan(const char* text, int maxDepth) {
     return false;
 }
 
+// The UTF-8 continuation bytes a lead byte announces; -1 for a byte that cannot start a sequence.
+int continuationBytesOf(unsigned char lead) {
+    if (lead < 0x80) {
+        return 0;
+    }
+    if (lead >= 0xC0 && lead < 0xE0) {
+        return 1;
+    }
+    if (lead >= 0xE0 && lead < 0xF0) {
+        return 2;
+    }
+    if (lead >= 0xF0 && lead < 0xF8) {
+        return 3;
+    }
+    return -1;
+}
+
+// TinyXML reading UTF-8 takes a lead byte's announced length on trust: "\xE0</a>" reads as one
+// character and "/a>", so the markup after a bad lead byte vanishes and a hostile document
+// nests as deep as it likes behind the depth check. Every byte that is not part of a
+// well-formed sequence becomes '?', which both readings agree on.
+void replaceMalformedUtf8(char* text) {
+    unsigned char* p = reinterpret_cast<unsigned char*>(text);
+    while (*p != '\0') {
+        const int needed = continuationBytesOf(*p);
+        int present = 0;
+        while (present < needed && (p[1 + present] & 0xC0) == 0x80) {
+            ++present;
+        }
+        if (needed < 0 || present < needed) {
+            *p++ = '?';
+        } else {
+            p += 1 + needed;
+        }
+    }
+}
+
+// The encoding named by the declaration opening at p ("<?xml"); empty when it names none.
+std::string declaredEncoding(const char* p) {
+    const char* end = std::strstr(p, "?>");
+    const char* name = std::strstr(p, "encoding");
+    if (!name || (end && name > end)) {
+        return std::string();
+    }
+    const char* value = skipSpace(name + std::strlen("encoding"));
+    if (*value != '=') {
+        return std::string();
+    }
+    value = skipSpace(value + 1);
+    const char quote = *value;
+    const char* close = quote == '"' || quote == '\'' ? std::strchr(value + 1, quote) : nullptr;
+    return close ? std::string(value + 1, close) : std::string();
+}
+
+// Reads the text as UTF-8 after a byte order mark or under a declaration naming UTF-8 or no
+// encoding, one byte a character otherwise: the choice TinyXML makes by itself, made here so
+// that the text can be prepared for it and the parser told.
+bool readsAsUtf8(const char* text) {
+    if (startsWith(text, "\xEF\xBB\xBF")) {
+        return true;
+    }
+    const char* p = skipSpace(text);
+    if (!isDeclarationStart(p)) {
+        return false;
+    }
+    const std::string encoding = declaredEncoding(p);
+    return encoding.empty() || equalsIgnoringCase(encoding.c_str(), "utf-8") ||
+           equalsIgnoringCase(encoding.c_str(), "utf8");
+}
+
 }  // namespace
 
 bool XmlUtils::load(const std::vector<unsigned char>& bytes, bool gzipped, TiXmlDocument& doc) {
@@ -205,11 +276,15 @@ bool XmlUtils::load(IO::InputStream* stream, TiXmlDocument& doc) {
     std::vector<char> text(static_cast<size_t>(size) + kTerminatorPadding, '\0');
     const int got = size > 0 ? stream->read(text.data(), size) : 0;
     text[got > 0 ? got : 0] = '\0';
+    const bool utf8 = readsAsUtf8(text.data());
+    if (utf8) {
+        replaceMalformedUtf8(text.data());
+    }
     if (nestsDeeperThan(text.data(), kMaxDepth)) {
         Logger::log(Logger::Error, "XmlUtils::load()[document nested deeper than %d levels]", kMaxDepth);
         return false;
     }
-    doc.Parse(text.data(), nullptr, TIXML_DEFAULT_ENCODING);
+    doc.Parse(text.data(), nullptr, utf8 ? TIXML_ENCODING_UTF8 : TIXML_ENCODING_LEGACY);
     return !doc.Error();
 }
 

@@ -1,20 +1,20 @@
 // Location: a short drive replayed from a GPX file (examples/demo/data,
 // written by make_tunnel_drive.py) as simulated satellite fixes, fifteen times
 // faster than driven. In the tunnel the receiver loses its fix; the location
-// manager hands over to network positioning, which asks a positioning server
-// on loopback with the simulated Wi-Fi and cell; out of the tunnel the
-// satellite fixes take over again. Every handover and every filtered position
-// the application would see is printed.
-#include <httplib.h>
+// manager hands over to network positioning, which asks the development
+// server (the "cellid" host of the startup answer) with the simulated Wi-Fi
+// and cell of the tunnel; out of the tunnel the satellite fixes take over
+// again. Every handover and every filtered position the application would see
+// is printed.
 #include <pal/Simulation.h>
 
 #include <cstdio>
 #include <memory>
 #include <string>
-#include <thread>
 #include <vector>
 
 #include "DemoScene.h"
+#include "devserver/Server.h"
 #include "location/LocationManager.h"
 #include "location/simulator/GpxPlayer.h"
 #include "location/simulator/GpxReader.h"
@@ -26,9 +26,6 @@ namespace {
 using Location::LocationManager;
 
 const float kReplayRate = 15.0f;
-// Where the server places the phone from its cell and Wi-Fi: in the tunnel.
-const char kPositionAnswer[] =
-    "<location><coordinates latitude=\"48.13505\" longitude=\"11.58660\" accuracy=\"120\"/></location>";
 
 const char* precisionName(int precision) {
     switch (precision) {
@@ -41,37 +38,32 @@ const char* precisionName(int precision) {
     }
 }
 
-// Main thread; the server answers on its own thread.
+// Main thread.
 class LocationScene : public DemoScene, public Location::LocationListener {
 public:
     LocationScene()
-        : port(0),
-          manager(nullptr),
+        : manager(nullptr),
           positions(0),
+          queriesBefore(0),
           lastPrecision(-1),
           finishTimer(callback<void (*)()>::make<LocationScene, &LocationScene::finish>(this)) {}
 
-    ~LocationScene() override {
-        detach();
-        if (serverThread.joinable()) {
-            server.stop();
-            serverThread.join();
-        }
-    }
+    ~LocationScene() override { detach(); }
 
     void run(Done done) override {
         finished = done;
         std::vector<Simulator::GpxPoint> points;
         std::string error;
         const std::string path = MAPCORE_DEMO_DATA "/tunnel-drive.gpx";
-        if (!startServer() || !readTrack(path, points, error)) {
-            demo::say("cannot run: %s", port <= 0 ? "no loopback port" : error.c_str());
+        if (!readTrack(path, points, error)) {
+            demo::say("cannot run: %s", error.c_str());
             finished();
             return;
         }
-        demo::say("positioning server on 127.0.0.1:%d; track %s: %zu points", port, path.c_str(),
-                  points.size());
-        configureDevice();
+        demo::say("track %s: %zu points; positioning server %s", path.c_str(), points.size(),
+                  Startup::StartupData::getInstance()->getHost(Startup::StartupData::HOST_CELLID).c_str());
+        scriptTunnelRadios();
+        queriesBefore = demo::server().journal().positionings.size();
         player.reset(new Simulator::GpxPlayer(points, kReplayRate));
         manager = LocationManager::getInstance();
         manager->addLocationListener(this);
@@ -82,6 +74,7 @@ public:
 
     void onLocationChanged(LocationManager*, const Location::Location& location) override {
         ++positions;
+        demo::addCount(std::string(precisionName(location.precision)) + " fixes delivered");
         if (location.precision != lastPrecision) {
             demo::say("  ---- positions now from %s ----", precisionName(location.precision));
             lastPrecision = location.precision;
@@ -97,19 +90,6 @@ public:
     }
 
 private:
-    bool startServer() {
-        server.Get("/cellid_location/", [](const httplib::Request& request, httplib::Response& response) {
-            demo::say("  server: positioning request with %zu parameters (wifinetworks=%s)",
-                      request.params.size(), request.get_param_value("wifinetworks").c_str());
-            response.set_content(kPositionAnswer, "text/xml");
-        });
-        port = server.bind_to_any_port("127.0.0.1");
-        if (port > 0) {
-            serverThread = std::thread([this] { server.listen_after_bind(); });
-        }
-        return port > 0;
-    }
-
     static bool readTrack(const std::string& path, std::vector<Simulator::GpxPoint>& points,
                           std::string& error) {
         std::unique_ptr<FILE, int (*)(FILE*)> file(std::fopen(path.c_str(), "rb"), &std::fclose);
@@ -126,12 +106,8 @@ private:
         return Simulator::GpxReader::parse(bytes, points, error);
     }
 
-    // What the startup answer and the radios would give on a device.
-    void configureDevice() {
-        Startup::StartupData* startup = Startup::StartupData::getInstance();
-        startup->setHost(Startup::StartupData::HOST_CELLID, "http://127.0.0.1:" + std::to_string(port) + "/");
-        startup->uuid = "demo-client";
-        startup->startupReady = true;
+    // What the radios see in the tunnel; the server knows these.
+    static void scriptTunnelRadios() {
         pal::scriptWifiScan(
             pal::Answer::after(50 * 1000000ull),
             {{"00:1a:2b:3c:4d:5e", "tunnel-cafe", -71}, {"00:1a:2b:3c:4d:5f", "tunnel-guest", -80}});
@@ -146,6 +122,12 @@ private:
 
     void finish() {
         demo::say("track replayed: %d positions reached the application", positions);
+        const DevServer::Journal journal = demo::server().journal();
+        for (size_t i = queriesBefore; i < journal.positionings.size(); ++i) {
+            const DevServer::PositioningRecord& query = journal.positionings[i];
+            demo::say("  the server was asked with %zu radios in the tunnel and answered %s",
+                      query.radios.size(), query.found ? "a position" : query.error.c_str());
+        }
         detach();
         finished();
     }
@@ -161,12 +143,10 @@ private:
         }
     }
 
-    httplib::Server server;
-    int port;
-    std::thread serverThread;
     std::unique_ptr<Simulator::GpxPlayer> player;
     LocationManager* manager;
     int positions;
+    size_t queriesBefore;
     int lastPrecision;
     Util::Timer finishTimer;
     Done finished;

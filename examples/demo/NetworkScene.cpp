@@ -59,6 +59,20 @@ public:
           networkReturns(callback<void (*)()>::make<NetworkScene, &NetworkScene::goOnline>(this)) {}
 
     ~NetworkScene() override {
+        stopListening();
+        for (const boost::shared_ptr<SceneTask>& task : tasks) {
+            manager->cancel(task);
+        }
+        pal::setReachability(KD_NETWORK_REACHABLE_VIA_WIFI_ZVR);
+        if (serverThread.joinable()) {
+            server.stop();
+            serverThread.join();
+        }
+    }
+
+    // The later scenes use the network too; their traffic is not this
+    // scene's to print.
+    void stopListening() {
         manager->removeOfflineModeStatusCallback(
             NetworkManager::OfflineModeStatusCallback::make<NetworkScene, &NetworkScene::onOffline>(this));
         manager->removeNetworkReachabilityStatusCallback(
@@ -69,14 +83,6 @@ public:
         manager->removeNetworkActivityStatusCallback(
             NetworkManager::NetworkActivityStatusCallback::make<NetworkScene, &NetworkScene::onActivity>(
                 this));
-        for (const boost::shared_ptr<SceneTask>& task : tasks) {
-            manager->cancel(task);
-        }
-        pal::setReachability(KD_NETWORK_REACHABLE_VIA_WIFI_ZVR);
-        if (serverThread.joinable()) {
-            server.stop();
-            serverThread.join();
-        }
     }
 
     void run(Done done) override {
@@ -183,6 +189,7 @@ private:
         }
         demo::say("summary: %zu tasks, %d attempts, %d retries, finish codes:%s", tasks.size(), attempts,
                   retries, codes.c_str());
+        stopListening();
         finished();
     }
 

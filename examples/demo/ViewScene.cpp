@@ -329,9 +329,13 @@ private:
             demo::say("no frame to save (no GLES context)");
             return;
         }
-        std::string path = (std::filesystem::temp_directory_path() / "mapcore-demo-view.png").string();
+        std::string path = (std::filesystem::path(demo::outputFolder()) / "view.png").string();
         if (savePng(path, rgba, width, height)) {
             demo::say("saved the last frame (%dx%d) to %s", width, height, path.c_str());
+            demo::noteFile(path,
+                           "the view's last frame, " + std::to_string(width) + "x" + std::to_string(height));
+        } else {
+            demo::say("could not write %s", path.c_str());
         }
     }
 

@@ -3,6 +3,8 @@
 #include <algorithm>
 #include <boost/make_shared.hpp>
 #include <filesystem>
+#include <fstream>
+#include <iterator>
 
 #include "IoTest.h"
 #include "io/FileManager.h"
@@ -182,4 +184,26 @@ TEST_F(FileManagerTest, ScanDirectoryAppendsMatchingFilesDepthFirstAndLeavesTheO
     FileManager::scanDirectory("/data/none", out, nullptr, true);
     EXPECT_EQ(before, out);
     EXPECT_TRUE(hasLogLine("FileManager::scanDirectory()[could not open dir]"));
+}
+
+TEST_F(FileManagerTest, APackageWhoseDirectoryClaimsMoreThanTheFileHoldsIsNoPackageAndSaysSoOnce) {
+    writePackage("/res/app.pak");
+    Bytes bytes;
+    {
+        std::ifstream in(hostPath("/res/app.pak"), std::ios::binary);
+        bytes.assign(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
+    }
+    // The first directory record claims a name, extra field and comment of about 64 KiB each.
+    const Bytes central = {0x50, 0x4b, 0x01, 0x02};
+    auto record = std::search(bytes.begin(), bytes.end(), central.begin(), central.end());
+    ASSERT_NE(bytes.end(), record);
+    std::fill(record + 28, record + 34, 0xff);
+    writeFile("/res/app.pak", bytes);
+
+    init();
+    expectAssertion("false");
+    EXPECT_EQ(1u, logLines().size());
+    EXPECT_EQ(1, countLogLines("is damaged or runs past the archive"));
+    EXPECT_FALSE(FileManager::openInputRes("a.png"));
+    EXPECT_TRUE(hasLogLine("File a.png not found in resource"));
 }

@@ -289,3 +289,45 @@ TEST_F(ZipFileTest, ACorruptArchiveNeverCrashesAndNeverHandsOutDamagedInflatedDa
         claimAssertions();
     }
 }
+
+TEST_F(ZipFileTest, ADirectoryRecordRunningPastTheArchiveIsRefusedAtOpenWithOneLineAndFewReads) {
+    // Counts what reaches the archive stream: minizip walks a claimed field byte by byte, and
+    // none of that may turn into a read or seek of the stream each.
+    class CountingStream : public IO::ByteArrayInputStream {
+    public:
+        using ByteArrayInputStream::ByteArrayInputStream;
+        int read(void* buffer, int length) override {
+            ++calls;
+            return ByteArrayInputStream::read(buffer, length);
+        }
+        void seek(long long offset, KDfileSeekOrigin origin) override {
+            ++calls;
+            ByteArrayInputStream::seek(offset, origin);
+        }
+        int calls = 0;
+    };
+    // Name, extra field and comment lengths of the first directory record.
+    const unsigned int claims[][3] = {
+        {0xfffb, 0xffff, 0xfffd}, {5, 0xffff, 0}, {5, 0, 0xfff0}, {0xff00, 0, 0}};
+    const Bytes intact = textAndBinary();
+    boost::shared_ptr<CountingStream> intactStream =
+        boost::make_shared<CountingStream>(intact.data(), static_cast<int>(intact.size()));
+    ASSERT_TRUE(boost::make_shared<ZipFile>()->init(intactStream, nullptr));
+    for (const auto& lengths : claims) {
+        Bytes bytes = intact;
+        const Bytes central = {0x50, 0x4b, 0x01, 0x02};
+        auto record = std::search(bytes.begin(), bytes.end(), central.begin(), central.end());
+        for (int field = 0; field < 3; ++field) {
+            record[28 + 2 * field] = static_cast<unsigned char>(lengths[field]);
+            record[29 + 2 * field] = static_cast<unsigned char>(lengths[field] >> 8);
+        }
+        clearLog();
+        boost::shared_ptr<CountingStream> stream =
+            boost::make_shared<CountingStream>(bytes.data(), static_cast<int>(bytes.size()));
+        EXPECT_FALSE(boost::make_shared<ZipFile>()->init(stream, nullptr)) << lengths[1];
+        expectAssertion("false");
+        EXPECT_EQ(1u, logLines().size()) << lengths[1];
+        EXPECT_EQ(1, countLogLines("ZipFile: directory record 1 of 2 is damaged")) << lengths[1];
+        EXPECT_LE(stream->calls, intactStream->calls) << lengths[1];
+    }
+}

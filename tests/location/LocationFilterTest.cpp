@@ -1,7 +1,10 @@
 #include <gtest/gtest.h>
 
+#include <limits>
+
 #include "location/LocationFilterAverage.h"
 #include "location/LocationFilterAverageCourse.h"
+#include "location/LocationFilterAveragePosition.h"
 #include "location/LocationFilterGenerateCourse.h"
 #include "location/LocationFilterGenerateSpeed.h"
 #include "location/LocationFilterKalman.h"
@@ -75,6 +78,99 @@ TEST_F(LocationFilterTest, JumpOf83MetresOrMoreRestartsTheSmoothing) {
             EXPECT_LT(metresBetween(far, out), 0.5f) << jump;
         } else {
             EXPECT_GT(metresBetween(far, out), 20.0f) << jump;
+        }
+    }
+}
+
+// A receiver driving a straight road without noise: the smoothed position
+// must be where the car is, not where it was a fix or two ago.
+struct Drive {
+    float speed;
+    float course;
+    bool reportsBearing;
+};
+
+void PrintTo(const Drive& drive, std::ostream* out) {
+    *out << drive.speed << " m/s at " << drive.course << (drive.reportsBearing ? "" : " without bearing");
+}
+
+class LocationFilterDriveTest : public LocationFilterTest, public ::testing::WithParamInterface<Drive> {};
+
+TEST_P(LocationFilterDriveTest, NoiselessStraightDriveComesOutWhereTheCarIs) {
+    const Drive drive = GetParam();
+    const float radians = drive.course * 0.017453292f;
+    Location::LocationFilterAverage chain;
+    Location::LocationFilterKalman kalman;
+    for (int i = 0; i < 20; ++i) {
+        const float along = drive.speed * i;
+        Fix truth = fix(along * kdCosf(radians), along * kdSinf(radians), i + 1, drive.speed,
+                        drive.reportsBearing ? drive.course : -1.0f, 8.0f);
+        truth.fixTime = 1000 * (i + 1);
+        EXPECT_LT(metresBetween(truth, chain.filter(truth)), 1.5f) << "chain, fix " << i;
+        EXPECT_LT(metresBetween(truth, kalman.filter(truth)), drive.reportsBearing ? 1.5f : 3.0f)
+            << "Kalman, fix " << i;
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(Drives, LocationFilterDriveTest,
+                         ::testing::Values(Drive{14.0f, 90.0f, true}, Drive{30.0f, 225.0f, true},
+                                           Drive{2.0f, 330.0f, true}, Drive{14.0f, 160.0f, false}));
+
+TEST_F(LocationFilterTest, PositionAverageCarriesOlderFixesAlongTheirReportedMotion) {
+    struct Case {
+        float speed, bearing;
+        KDust secondsApart;
+        float north, east;  // where three fixes at one spot average to
+    };
+    const Case cases[] = {
+        {-1.0f, -1.0f, 1, 0, 0},                         // no speed: averaged where they are
+        {0.5f, -1.0f, 1, 0, 0},                          // standing receivers report no bearing
+        {5.0f, 90.0f, 1, 0, 5},                          // mean of 10, 5 and 0 m carried east
+        {5.0f, 0.0f, 1, 5, 0},   {5.0f, 0.0f, 0, 0, 0},  // no time between them, nothing to carry
+        {5.0f, -1.0f, 1, 0, 0},                          // moving, but nowhere known: the newest alone
+    };
+    for (const Case& c : cases) {
+        Location::LocationFilterAveragePosition average;
+        Fix out;
+        for (KDust i = 0; i < 3; ++i) {
+            Fix spot =
+                fixNear(kLat, kLon, 0, 0, 10.0f, (10 + i * c.secondsApart) * kSecond, c.speed, c.bearing);
+            spot.altitude = 100.0f + i;
+            out = average.filter(spot);
+        }
+        const Fix expected = fix(c.north, c.east, 0);
+        EXPECT_LT(metresBetween(expected, out), 0.3f) << c.speed << " m/s at " << c.bearing;
+        EXPECT_EQ(c.speed == 5.0f && c.bearing < 0.0f ? 102.0f : 101.0f, out.altitude);
+    }
+}
+
+TEST_F(LocationFilterTest, PositionAverageAcrossTheDateLineStaysThere) {
+    Location::LocationFilterAveragePosition average;
+    Fix out;
+    for (float longitude : {179.9999f, -179.9999f, 179.9999f}) {
+        out = average.filter(fixNear(kLat, longitude, 0, 0, 10.0f, kSecond));
+    }
+    EXPECT_GT(kdFabsf(out.longitude), 179.999f);
+    EXPECT_LE(kdFabsf(out.longitude), 180.0f);
+}
+
+// The provider cleans fixes before filtering; the position filters must not
+// turn what slips through into a position off the map.
+TEST_F(LocationFilterTest, UnusableSpeedsAndBearingsLeaveFinitePositions) {
+    const float nan = std::numeric_limits<float>::quiet_NaN();
+    const float inf = std::numeric_limits<float>::infinity();
+    const float values[][2] = {{nan, 90.0f}, {14.0f, nan}, {inf, 90.0f}, {14.0f, inf}, {-5.0f, 90.0f}};
+    for (const auto& value : values) {
+        Location::LocationFilterMinDistance minDistance;
+        Location::LocationFilterAveragePosition average;
+        Location::LocationFilterKalman kalman;
+        for (int i = 0; i < 6; ++i) {
+            Fix bad = fix(14.0f * i, 0, i + 1, value[0], value[1], 8.0f);
+            bad.fixTime = i % 2 == 0 ? 1000 * (i + 1) : std::numeric_limits<KDint64>::max();
+            for (const Fix& out : {average.filter(minDistance.filter(bad)), kalman.filter(bad)}) {
+                EXPECT_TRUE(out.hasUsablePosition()) << value[0] << " m/s at " << value[1] << ", fix " << i;
+                EXPECT_LT(metresBetween(bad, out), 100.0f) << value[0] << " m/s at " << value[1];
+            }
         }
     }
 }

@@ -87,13 +87,20 @@ protected:
 
 TEST_F(LocationManagerTest, SatelliteFixesReachListenersThroughTheFilters) {
     EXPECT_TRUE(pal::isLocationStarted());
+    // Driving north at 10 m/s, swaying 6 m sideways from fix to fix.
+    const float swayDegrees = 6.0f / 74400.0f;
+    KDLocationFixZVR newest = fixAt(0.0f);
     for (int i = 0; i < 4; ++i) {
-        deliver(fixAt(10.0f * i));
+        newest = fixAt(10.0f * i);
+        newest.longitude += i % 2 == 0 ? 0.0f : swayDegrees;
+        deliver(newest);
     }
     ASSERT_EQ(4u, heard.locations.size());
     EXPECT_EQ(Location::PrecisionSatellite, heard.locations.back().precision);
-    // The position average lags behind the newest fix.
-    EXPECT_LT(heard.locations.back().latitude, fixAt(30.0f).latitude);
+    // The position average takes out the sway and keeps up with the drive.
+    EXPECT_GT(heard.locations.back().longitude, 11.0f + 0.2f * swayDegrees);
+    EXPECT_LT(heard.locations.back().longitude, 11.0f + 0.8f * swayDegrees);
+    EXPECT_NEAR(newest.latitude, heard.locations.back().latitude, 1.0f / 111200.0f);
     EXPECT_EQ(0, heard.locations.back().fixTime);
     EXPECT_EQ(heard.locations.back().latitude, manager->getLastLocation().latitude);
     EXPECT_EQ(Location::PrecisionSatellite, manager->getPrecision());

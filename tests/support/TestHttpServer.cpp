@@ -59,7 +59,7 @@ TestHttpServer::Impl::Impl(const Options& options) {
     int threads = options.threads;
     server.new_task_queue = [threads] { return new httplib::ThreadPool(threads); };
     server.set_keep_alive_max_count(options.keepAliveMaxCount);
-    server.set_keep_alive_timeout(1);
+    server.set_keep_alive_timeout(options.keepAliveTimeoutSeconds);
     // Headers and body leave in separate writes; Nagle would hold the body
     // back until the client's delayed ACK.
     server.set_tcp_nodelay(true);

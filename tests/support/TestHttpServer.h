@@ -64,6 +64,11 @@ public:
         // Requests served per connection before the server closes it; 1 frees
         // a server thread after every answer, for many simultaneous clients.
         int keepAliveMaxCount = 100;
+        // How long a server thread waits for the next request on a connection, the first one
+        // included, before it closes the connection. Short, because a server thread that waits
+        // on a client's idle connection holds up the server's shutdown that long; many clients
+        // starting at once on a loaded machine need longer before each sends its request.
+        int keepAliveTimeoutSeconds = 1;
     };
 
     TestHttpServer();

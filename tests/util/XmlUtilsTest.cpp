@@ -121,6 +121,46 @@ TEST_F(XmlUtilsTest, DocumentsNestedDeeperThanTheLimitAreRefusedBeforeTheParserS
     }
 }
 
+// A UTF-8 lead byte announcing more bytes than follow must not swallow markup: "\xE0</a>" read
+// as one character would nest 200,000 levels past the depth check and overflow the stack.
+TEST_F(XmlUtilsTest, MalformedUtf8CannotHideMarkupFromTheDepthCheck) {
+    const std::string utf8 = "<?xml version=\"1.0\" encoding=\"UTF-8\"?>";
+    const auto* root = parse(utf8 + "<r>" + repeat("<a>\xe0</a>", 200000) + "</r>");
+    ASSERT_NE(nullptr, root);
+    EXPECT_STREQ("?", XmlUtils::getText(root->FirstChildElement("a"), "").c_str());
+    EXPECT_EQ(nullptr, root->FirstChildElement("a")->FirstChildElement());
+
+    // A comment whose "<!" a lead byte would swallow stays a comment.
+    root = parse("<?xml version=\"1.0\"?><r>\xf0<!-- " + repeat("<a>", 1000) + " --></r>");
+    ASSERT_NE(nullptr, root);
+    EXPECT_EQ(nullptr, root->FirstChildElement());
+
+    // Stray continuation bytes and bytes no sequence starts with.
+    root = parse("\xef\xbb\xbf<r>\x80\xff\xc3</r>");
+    ASSERT_NE(nullptr, root);
+    EXPECT_STREQ("???", XmlUtils::getText(root, "").c_str());
+}
+
+TEST_F(XmlUtilsTest, WellFormedUtf8AndSingleByteDocumentsKeepTheirText) {
+    const std::string cyrillic = "\xd0\x9f\xd1\x80\xd0\xb8\xd0\xb2\xd0\xb5\xd1\x82";  // UTF-8
+    const std::string moscow1251 = "\xcc\xee\xf1\xea\xe2\xe0";                          // ends in 0xE0
+    const struct {
+        std::string document;
+        std::string text;
+    } cases[] = {
+        {"<?xml version=\"1.0\" encoding=\"utf-8\"?><r>" + cyrillic + " &#1055;</r>", cyrillic + " \xd0\x9f"},
+        {"<?xml version=\"1.0\"?><r>" + cyrillic + "</r>", cyrillic},
+        {"\xef\xbb\xbf<r>" + cyrillic + "</r>", cyrillic},
+        {"<?xml version=\"1.0\" encoding=\"windows-1251\"?><r>" + moscow1251 + "</r>", moscow1251},
+        {"<r>" + moscow1251 + "</r>", moscow1251},
+    };
+    for (const auto& c : cases) {
+        const auto* root = parse(c.document);
+        ASSERT_NE(nullptr, root) << c.document;
+        EXPECT_EQ(c.text, XmlUtils::getText(root, "")) << c.document;
+    }
+}
+
 TEST_F(XmlUtilsTest, TextAndAttributeGettersFallBackForMissingOrUnreadableValues) {
     const TiXmlElement* root =
         parse("<r s=\"v\" i=\"-12\" f=\"2.5\" bad=\"x\"><n> 42x</n><f>-2.5e1</f><empty/><s>text</s></r>");

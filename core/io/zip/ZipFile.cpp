@@ -20,6 +20,9 @@ namespace {
 // Deflate's densest form carries about 1032 output bytes per input byte.
 const unsigned long long kMaxDeflateRatio = 1032;
 
+// The fixed part of a central directory record; its name, extra field and comment follow.
+const unsigned long long kDirectoryRecordSize = 46;
+
 // minizip reads a directory record in many small pieces; they come from this much read ahead.
 const size_t kReadAhead = 16 * 1024;
 
@@ -64,8 +67,8 @@ uLong ZipFile::readArchive(unsigned char* buffer, uLong size) {
             position += count;
             continue;
         }
-        stream->seek(position, KD_SEEK_SET);
         if (wanted >= kReadAhead) {
+            stream->seek(position, KD_SEEK_SET);
             const int count =
                 stream->read(buffer + done, static_cast<int>(std::min<unsigned long long>(wanted, INT_MAX)));
             if (count <= 0) {
@@ -75,11 +78,14 @@ uLong ZipFile::readArchive(unsigned char* buffer, uLong size) {
             position += count;
             continue;
         }
-        ahead.resize(static_cast<size_t>(std::min<long long>(kReadAhead, archiveSize - position)));
+        // Aligned windows: minizip looks for the end records backwards in small steps, which
+        // a window starting at each request would miss every time.
+        aheadStart = position - position % static_cast<long long>(kReadAhead);
+        stream->seek(aheadStart, KD_SEEK_SET);
+        ahead.resize(static_cast<size_t>(std::min<long long>(kReadAhead, archiveSize - aheadStart)));
         const int count = stream->read(ahead.data(), static_cast<int>(ahead.size()));
-        aheadStart = position;
         ahead.resize(count > 0 ? count : 0);
-        if (ahead.empty()) {
+        if (position >= aheadStart + static_cast<long long>(ahead.size())) {
             break;
         }
     }
@@ -162,6 +168,7 @@ bool ZipFile::open(boost::shared_ptr<InputStream> archive) {
 
     file = unzOpen2_64("res", &functions);
     if (!file) {
+        Logger::log(Logger::Error, "ZipFile: not a zip archive (%lld bytes)", archiveSize);
         KD_ASSERT(false);
         return false;
     }
@@ -171,20 +178,22 @@ bool ZipFile::open(boost::shared_ptr<InputStream> archive) {
 bool ZipFile::buildIndex() {
     unz_global_info64 info;
     if (unzGetGlobalInfo64(file, &info) != UNZ_OK) {
+        Logger::log(Logger::Error, "ZipFile: the central directory cannot be read");
         KD_ASSERT(false);
         return false;
     }
     boost::shared_ptr<ZipEntryMap> entries = boost::make_shared<ZipEntryMap>();
-    // The count is a claim; a directory record takes at least 46 bytes of the archive.
-    entries->reserve(static_cast<size_t>(std::min<unsigned long long>(info.number_entry, archiveSize / 46)));
+    // The count is a claim; a directory record takes at least this much of the archive.
+    entries->reserve(static_cast<size_t>(
+        std::min<unsigned long long>(info.number_entry, archiveSize / kDirectoryRecordSize)));
     for (ZPOS64_T i = 0; i < info.number_entry; ++i) {
         int result = i == 0 ? unzGoToFirstFile(file) : unzGoToNextFile(file);
-        if (result != UNZ_OK) {
-            KD_ASSERT(false);
-            return false;
-        }
         ZipEntry entry;
-        if (!readCurrentEntry(entry)) {
+        if (result != UNZ_OK || !readCurrentEntry(entry)) {
+            // One line for the whole archive: it is refused here, not entry by entry.
+            Logger::log(
+                Logger::Error, "ZipFile: directory record %llu of %llu is damaged or runs past the archive",
+                static_cast<unsigned long long>(i + 1), static_cast<unsigned long long>(info.number_entry));
             KD_ASSERT(false);
             return false;
         }
@@ -198,11 +207,20 @@ bool ZipFile::buildIndex() {
 bool ZipFile::readCurrentEntry(ZipEntry& entry) {
     // Most entries fit these buffers and are read in one call; a longer name, extra field or
     // any comment is read again at its full length (a cut name would be unterminated).
+    unz64_file_pos position;
     unz_file_info64 info;
     char name[256];
     unsigned char extra[64];
-    if (unzGetCurrentFileInfo64(file, &info, name, sizeof(name), extra, sizeof(extra), nullptr, 0) !=
-        UNZ_OK) {
+    if (unzGetFilePos64(file, &position) != UNZ_OK ||
+        unzGetCurrentFileInfo64(file, &info, name, sizeof(name), extra, sizeof(extra), nullptr, 0) !=
+            UNZ_OK) {
+        return false;
+    }
+    // The three lengths are claims: the texts are read at their full length only when the record
+    // could hold them.
+    const unsigned long long recordEnd = position.pos_in_zip_directory + kDirectoryRecordSize +
+                                         info.size_filename + info.size_file_extra + info.size_file_comment;
+    if (recordEnd > static_cast<unsigned long long>(archiveSize)) {
         return false;
     }
     if (info.size_filename < sizeof(name) && info.size_file_extra <= sizeof(extra) &&
@@ -215,10 +233,6 @@ bool ZipFile::readCurrentEntry(ZipEntry& entry) {
     entry.compressed = info.compression_method != 0;
     entry.compressedSize = static_cast<unsigned int>(info.compressed_size);
     entry.uncompressedSize = static_cast<unsigned int>(info.uncompressed_size);
-    unz64_file_pos position;
-    if (unzGetFilePos64(file, &position) != UNZ_OK) {
-        return false;
-    }
     entry.directoryPosition = position.pos_in_zip_directory;
     entry.entryNumber = position.num_of_file;
     return true;

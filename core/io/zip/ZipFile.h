@@ -24,7 +24,8 @@ public:
 
     // Opens the archive. With preparedEntries (an index made earlier for the same archive)
     // the central directory is not read again and the index is copied. False, with an
-    // assertion failure, when the archive cannot be read.
+    // assertion failure and one error line, when the archive cannot be read or its directory
+    // claims more than the archive holds.
     bool init(boost::shared_ptr<InputStream> archive, const ZipEntryMap* preparedEntries);
     // The same with a prepared index that is shared rather than copied, so that opening an
     // entry of a large package costs no copy of its index.

@@ -1,0 +1,83 @@
+#include "location/impl/Motion.h"
+
+#include "location/impl/BearingMath.h"
+#include "math/CoordConversion.h"
+
+namespace Location {
+namespace Motion {
+
+namespace {
+
+const float kSemiMajorAxis = 6378137.0f;
+const float kEccentricitySquared = 0.0066943800f;
+// As the world projection, which stops there; the east-west scale would grow
+// without bound towards the pole.
+const float kMaxLatitude = 89.3f;
+
+// Faster than anything that carries a receiver.
+const float kMaxSpeed = 1.0e4f;
+
+// Written so that NaN is neither.
+bool hasSpeed(const Location& fix) {
+    return fix.speed >= 0.0f && fix.speed <= kMaxSpeed;
+}
+
+bool hasBearing(const Location& fix) {
+    return fix.bearing >= 0.0f && fix.bearing <= 360.0f;
+}
+
+}  // namespace
+
+const float kWalkingPace = 1.3888890f;
+
+bool velocity(const Location& fix, float& east, float& north) {
+    east = 0.0f;
+    north = 0.0f;
+    if (!hasSpeed(fix)) {
+        return false;
+    }
+    if (!hasBearing(fix)) {
+        return fix.speed < kWalkingPace;
+    }
+    const float radians = BearingMath::degreesToRadians(fix.bearing);
+    east = fix.speed * kdSinf(radians);
+    north = fix.speed * kdCosf(radians);
+    return true;
+}
+
+bool velocityXY(const Location& fix, float& vx, float& vy) {
+    float east, north;
+    const bool known = velocity(fix, east, north);
+    // World units per metre at the fix, kept to a hundredth of a unit.
+    int perHundredMetres = 0;
+    CoordConversion::MtoXY(fix.latitude, 100.0f, perHundredMetres);
+    const float scale = static_cast<float>(perHundredMetres) / 100.0f;
+    vx = east * scale;
+    vy = -north * scale;
+    return known;
+}
+
+bool isMoving(const Location& fix) {
+    return hasSpeed(fix) && fix.speed >= kWalkingPace && hasBearing(fix);
+}
+
+// From the meridian and prime-vertical radii of curvature.
+void degreesPerMetre(float latitude, float& latitudeDegrees, float& longitudeDegrees) {
+    const float absolute = kdFabsf(latitude);
+    const float radians = BearingMath::degreesToRadians(absolute < kMaxLatitude ? absolute : kMaxLatitude);
+    const float sine = kdSinf(radians);
+    const float w = kdSqrtf(1.0f - kEccentricitySquared * sine * sine);
+    const float meridian = kSemiMajorAxis * (1.0f - kEccentricitySquared) / (w * w * w);
+    const float primeVertical = kSemiMajorAxis / w;
+    const float degreesPerRadian = 57.295776f;
+    latitudeDegrees = degreesPerRadian / meridian;
+    longitudeDegrees = degreesPerRadian / (primeVertical * kdCosf(radians));
+}
+
+float secondsBetween(const Location& older, const Location& newer) {
+    const KDint64 elapsed = static_cast<KDint64>(newer.time - older.time);
+    return elapsed > 0 ? static_cast<float>(elapsed) / 1.0e9f : 0.0f;
+}
+
+}  // namespace Motion
+}  // namespace Location

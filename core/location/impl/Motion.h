@@ -1,0 +1,34 @@
+#pragma once
+
+#include "location/Location.h"
+
+namespace Location {
+namespace Motion {
+
+// How a fix says it moves, for filters that carry positions through time.
+// Single precision; any thread.
+
+// Below this pace (5 km/h) receivers stop reporting a bearing, and a fix that
+// reports no bearing counts as standing.
+extern const float kWalkingPace;
+
+// The velocity a fix reports, in metres per second east and north. False
+// when the fix reports no speed, or walking pace or more without a bearing:
+// then nothing is known about where it goes.
+bool velocity(const Location& fix, float& east, float& north);
+// The same in world units per second (x east, y south).
+bool velocityXY(const Location& fix, float& vx, float& vy);
+
+// True when the fix reports moving at walking pace or faster along a bearing.
+bool isMoving(const Location& fix);
+
+// Degrees of latitude and longitude per metre north and east at a latitude,
+// on the WGS 84 ellipsoid; for displacements of up to a few kilometres.
+void degreesPerMetre(float latitude, float& latitudeDegrees, float& longitudeDegrees);
+
+// Seconds between the receive times of two fixes; 0 when the clock did not
+// move forward from `older` to `newer`.
+float secondsBetween(const Location& older, const Location& newer);
+
+}  // namespace Motion
+}  // namespace Location
