@@ -21,8 +21,10 @@ export TSAN_OPTIONS ?= halt_on_error=1:second_deadlock_stack=1:suppressions=$(SA
 # checked-in seed corpus only grows by hand.
 FUZZ_DIR ?= build-fuzz
 FUZZ_SECONDS ?= 60
+# make cross-test ARCH=arm64|armhf: cross-build in build-cross-ARCH and run the tests under qemu.
+ARCH ?= arm64
 
-.PHONY: deps configure build test demo bench fuzz-build fuzz fuzz-replay clean
+.PHONY: deps configure build test demo bench fuzz-build fuzz fuzz-replay cross-test clean
 
 deps:
 	@bash scripts/install-deps.sh
@@ -60,6 +62,9 @@ fuzz: fuzz-build
 # Each target once over its seed corpus, as CI does.
 fuzz-replay: fuzz-build
 	@ctest --test-dir $(FUZZ_DIR) --output-on-failure -j $(JOBS)
+
+cross-test:
+	@bash scripts/cross-test.sh $(ARCH) $(JOBS)
 
 clean:
 	@rm -rf $(BUILD_DIR) $(FUZZ_DIR)

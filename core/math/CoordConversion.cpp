@@ -133,7 +133,13 @@ void CoordConversion::toXY(float latDeg, float lonDeg, int& x, int& y) {
     } else if (lonDeg < -180.0f) {
         x = 0;
     } else {
-        x = truncateToInt((kHalfWorldWidth + lonDeg * kDegToRad * kEquatorialRadius) * kXYPerMetre);
+        // Where the compiler fuses the multiply and the add (ARM), the product
+        // keeps the rounding that a separate multiply drops, and -180 degrees
+        // lands a metre west of the world: the west edge saturates as the
+        // east edge does.
+        const KDint32 column =
+            truncateToInt((kHalfWorldWidth + lonDeg * kDegToRad * kEquatorialRadius) * kXYPerMetre);
+        x = column < 0 ? 0 : column;
     }
 
     const float phi = clamp(latDeg, -kMaxLatitude, kMaxLatitude) * kDegToRad;

@@ -42,6 +42,15 @@ TEST(CoordConversionTest, ProjectionSaturatesAtTheWorldEdgesAndClampsLatitude) {
     EXPECT_EQ(0, yOf(nan, nan));
 }
 
+TEST(CoordConversionTest, EveryLongitudeLiesInsideTheWorldWhateverTheFloatingPointUnit) {
+    int previous = 0;
+    for (float lon = -180.0f; lon <= 180.0f; lon += 0.0625f) {
+        const int x = xOf(0.0f, lon);
+        EXPECT_LE(previous, x) << "longitude " << lon;
+        previous = x;
+    }
+}
+
 TEST(CoordConversionTest, RowsGrowSouthwardsAndSaturateSouthOfTheWorldSquare) {
     // Rows south of about -85.05 degrees lie beyond 2^31; they must stay at
     // the south edge, not wrap round to the north by an overflowing negation.
