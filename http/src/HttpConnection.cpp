@@ -67,7 +67,7 @@ void HttpConnection::start() {
         return;
     }
     started = true;
-    boost::shared_ptr<HttpDeliveryQueue> deliveries = boost::make_shared<HttpDeliveryQueue>(weak_from_this());
+    deliveries = boost::make_shared<HttpDeliveryQueue>(weak_from_this());
     if (!request) {
         deliveries->pushFinished(HTTP_BAD_REQUEST_ERROR_CODE);
         deliveries->flush();

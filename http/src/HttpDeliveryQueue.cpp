@@ -1,5 +1,8 @@
 #include "HttpDeliveryQueue.h"
 
+#include <cstdint>
+#include <unordered_map>
+
 #include "HttpTransfer.h"
 #include "network/HttpConnection.h"
 
@@ -18,10 +21,26 @@ char deliveryEventToken;
 const std::size_t kMaxBacklogBytes = 1024 * 1024;
 const std::size_t kResumeBacklogBytes = kMaxBacklogBytes / 2;
 
+// Wake-up events name their queue by number instead of holding it: an event
+// its thread never handles (the thread ended, the platform shut down) then
+// owns nothing, and one handled after the queue went away finds no queue and
+// delivers nothing. The connection keeps its queue alive meanwhile.
+struct Registry {
+    KDThreadMutex* mutex = kdThreadMutexCreate(nullptr);
+    std::uintptr_t lastId = 0;
+    std::unordered_map<std::uintptr_t, HttpDeliveryQueue*> queues;
+};
+
+Registry& registry() {
+    static Registry* instance = new Registry();
+    return *instance;
+}
+
 }  // namespace
 
 HttpDeliveryQueue::HttpDeliveryQueue(const boost::weak_ptr<HttpConnection>& connection)
-    : callerThread(kdThreadSelf()),
+    : id(0),
+      callerThread(kdThreadSelf()),
       connection(connection),
       mutex(kdThreadMutexCreate(nullptr)),
       pendingBodyBytes(0),
@@ -29,9 +48,18 @@ HttpDeliveryQueue::HttpDeliveryQueue(const boost::weak_ptr<HttpConnection>& conn
       eventPosted(false),
       detached(false) {
     kdInstallCallback(&HttpDeliveryQueue::onEvent, KD_EVENT_USER, &deliveryEventToken);
+    Registry& known = registry();
+    kdThreadMutexLock(known.mutex);
+    id = ++known.lastId;
+    known.queues[id] = this;
+    kdThreadMutexUnlock(known.mutex);
 }
 
 HttpDeliveryQueue::~HttpDeliveryQueue() {
+    Registry& known = registry();
+    kdThreadMutexLock(known.mutex);
+    known.queues.erase(id);
+    kdThreadMutexUnlock(known.mutex);
     kdThreadMutexFree(mutex);
 }
 
@@ -102,16 +130,24 @@ void HttpDeliveryQueue::flush() {
     event->type = KD_EVENT_USER;
     event->userptr = &deliveryEventToken;
     event->timestamp = kdGetTimeUST();
-    event->data.p[0] = new boost::shared_ptr<HttpDeliveryQueue>(shared_from_this());
+    event->data.words[0] = static_cast<intptr_t>(id);
     kdPostThreadEvent(event, callerThread);
 }
 
 void HttpDeliveryQueue::onEvent(const KDEvent* event) {
-    boost::shared_ptr<HttpDeliveryQueue>* holder =
-        static_cast<boost::shared_ptr<HttpDeliveryQueue>*>(event->data.p[0]);
-    boost::shared_ptr<HttpDeliveryQueue> queue = *holder;
-    delete holder;
-    queue->deliverPending();
+    Registry& known = registry();
+    boost::shared_ptr<HttpDeliveryQueue> queue;
+    kdThreadMutexLock(known.mutex);
+    auto found = known.queues.find(static_cast<std::uintptr_t>(event->data.words[0]));
+    // A queue whose last owner is gone may still be listed until its
+    // destructor gets the lock; lock() then finds it expired.
+    if (found != known.queues.end()) {
+        queue = found->second->weak_from_this().lock();
+    }
+    kdThreadMutexUnlock(known.mutex);
+    if (queue) {
+        queue->deliverPending();
+    }
 }
 
 bool HttpDeliveryQueue::takeNext(Delivery& delivery) {

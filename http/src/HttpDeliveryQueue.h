@@ -5,6 +5,7 @@
 #include <boost/enable_shared_from_this.hpp>
 #include <boost/shared_ptr.hpp>
 #include <boost/weak_ptr.hpp>
+#include <cstdint>
 #include <deque>
 
 #include "network/DataChunk.h"
@@ -23,9 +24,9 @@ class HttpTransfer;
 // per round of work, so a response, its body and the finish that arrive
 // together cost the caller thread one wake-up, not three.
 //
-// Every wake-up event holds a reference to the queue, so an event queued
-// after a cancel or after the connection went away finds the queue alive and
-// detached, and delivers nothing.
+// The connection owns its queue; a wake-up event only names it, so an event
+// queued after a cancel finds the queue detached, one queued after the
+// connection went away finds no queue, and either delivers nothing.
 //
 // Body parts waiting for a slow caller are bounded: the engine asks
 // hasRoomForBody before it takes more from the socket, and hearing no, holds
@@ -74,6 +75,8 @@ private:
     // Caller thread: a body part of size bytes was taken off the queue.
     void noteBodyTaken(std::size_t size);
 
+    // The name wake-up events carry.
+    std::uintptr_t id;
     KDThread* callerThread;
     boost::weak_ptr<HttpConnection> connection;
     KDThreadMutex* mutex;

@@ -15,6 +15,7 @@
 
 namespace Network {
 
+class HttpDeliveryQueue;
 class HttpTransfer;
 
 // One HTTP exchange run by the HttpEngine. Owned through a shared pointer.
@@ -87,6 +88,9 @@ private:
     bool started;
     bool cancelled;
     boost::shared_ptr<HttpTransfer> transfer;
+    // Kept here so that results queued for this thread wait for it as long as
+    // the connection lives.
+    boost::shared_ptr<HttpDeliveryQueue> deliveries;
 };
 
 }  // namespace Network
