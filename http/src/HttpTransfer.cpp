@@ -540,22 +540,35 @@ size_t HttpTransfer::receiveBody(char* data, size_t length) {
 
 void HttpTransfer::keepWholeBody(const unsigned char* bytes, size_t length) {
     const int statusCode = head.getStatusCode();
+    const bool errorAnswer = statusCode < 200 || statusCode > 299;
     if (!wholeBodyData) {
         wholeBodyData = boost::make_shared<DataChunk>();
+        wholeBodyData->reserve(bodyCapacity(errorAnswer));
     }
     size_t kept = length;
-    if (statusCode < 200 || statusCode > 299) {
+    if (errorAnswer) {
         const size_t limit = HttpConnection::kMaxKeptErrorBodySize;
         kept = std::min(length, limit - std::min(wholeBodyData->size(), limit));
     }
-    // Grown by doubling, but never past the limit: a body just under it
-    // takes no more than the limit.
-    const size_t needed = wholeBodyData->size() + kept;
-    if (needed > wholeBodyData->capacity() && maxBodySize > 0) {
-        const size_t doubled = std::max(needed, 2 * wholeBodyData->capacity());
-        wholeBodyData->reserve(std::min(doubled, static_cast<size_t>(maxBodySize)));
-    }
     wholeBodyData->insert(wholeBodyData->end(), bytes, bytes + kept);
+}
+
+// The body is held in one block reserved at its first byte. Grown step by
+// step instead, it would leave the smaller blocks behind with the allocator,
+// still resident, and take twice its size. The block's pages are touched only
+// as the body arrives.
+size_t HttpTransfer::bodyCapacity(bool errorAnswer) const {
+    long long capacity = maxBodySize;
+    if (errorAnswer) {
+        const long long kept = static_cast<long long>(HttpConnection::kMaxKeptErrorBodySize);
+        capacity = capacity > 0 ? std::min(capacity, kept) : kept;
+    }
+    // libcurl delivers no more than a Content-Length announces.
+    const long long announced = head.toResponse().getContentLength();
+    if (announced >= 0 && (capacity <= 0 || announced < capacity)) {
+        capacity = announced;
+    }
+    return static_cast<size_t>(std::max(0LL, capacity));
 }
 
 size_t HttpTransfer::onUploadRead(char* buffer, size_t size, size_t count, void* self) {

@@ -102,6 +102,8 @@ private:
     void deliverResponse();
     size_t receiveBody(char* data, size_t length);
     void keepWholeBody(const unsigned char* bytes, size_t length);
+    // What to reserve for a whole body at its first byte; 0 when unbounded.
+    size_t bodyCapacity(bool errorAnswer) const;
     void reportSent();
     bool isFramingFault(CURLcode result) const;
     void finish(int code);
