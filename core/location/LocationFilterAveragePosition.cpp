@@ -36,14 +36,6 @@ float wrapLongitude(float longitude) {
     return longitudeDifference(0.0f, longitude);
 }
 
-// Carrying a fix forward near a pole can take the mean past it.
-float clampLatitude(float latitude) {
-    if (latitude > 90.0f) {
-        return 90.0f;
-    }
-    return latitude < -90.0f ? -90.0f : latitude;
-}
-
 void addAltitude(const Location& fix, float& sum, size_t& count) {
     if (fix.altitude != -1.0f) {
         sum += fix.altitude;
@@ -109,7 +101,7 @@ Location LocationFilterAveragePosition::filter(const Location& location) {
     }
     const float n = static_cast<float>(count);
     Location averaged = location;
-    averaged.latitude = clampLatitude(newest.latitude + latitudeOffset / n);
+    averaged.latitude = Motion::clampLatitude(newest.latitude + latitudeOffset / n);
     averaged.longitude = wrapLongitude(newest.longitude + longitudeOffset / n);
     averaged.altitude = altitudeCount > 0 ? altitudeSum / static_cast<float>(altitudeCount) : -1.0f;
     CoordConversion::toXY(averaged.latitude, averaged.longitude, averaged.x, averaged.y);

@@ -196,7 +196,7 @@ Location LocationFilterKalman::adjustLocation(const Location& fix) const {
     metresPerUnit /= 1.0e6f;
     float latitudePerMetre, longitudePerMetre;
     Motion::degreesPerMetre(fix.latitude, latitudePerMetre, longitudePerMetre);
-    adjusted.latitude = fix.latitude - offset.y * metresPerUnit * latitudePerMetre;
+    adjusted.latitude = Motion::clampLatitude(fix.latitude - offset.y * metresPerUnit * latitudePerMetre);
     adjusted.longitude = fix.longitude + offset.x * metresPerUnit * longitudePerMetre;
     adjusted.altitude = estimate.z;
     return adjusted;

@@ -1,5 +1,6 @@
 #include "location/LocationSmoother.h"
 
+#include "location/impl/Motion.h"
 #include "math/CoordConversion.h"
 
 namespace Location {
@@ -65,9 +66,7 @@ void LocationSmoother::glide(Location& result) {
     }
     --glideLeft;
     const float share = static_cast<float>(glideLeft) / static_cast<float>(kSwitchFixes);
-    float latitude = result.latitude + share * glideLatitude;
-    latitude = latitude > 90.0f ? 90.0f : (latitude < -90.0f ? -90.0f : latitude);
-    result.latitude = latitude;
+    result.latitude = Motion::clampLatitude(result.latitude + share * glideLatitude);
     result.longitude = longitudeDifference(0.0f, result.longitude + share * glideLongitude);
     CoordConversion::toXY(result.latitude, result.longitude, result.x, result.y);
 }

@@ -314,7 +314,7 @@ TEST_F(LocationFilterTest, PositionAverageNearThePoleStaysOnTheMap) {
     // Heading north at 30 m/s towards the pole, the last fix on it.
     for (int i = 0; i < 3; ++i) {
         const Fix heading =
-            fixNear(89.9994f + 0.0003f * i, 10.0f, 0, 0, 5.0f, (i + 1) * kSecond, 30.0f, 0.0f);
+            fixNear(89.9996f + 0.0002f * i, 10.0f, 0, 0, 5.0f, (i + 1) * kSecond, 30.0f, 0.0f);
         const Fix out = average.filter(heading);
         EXPECT_LE(out.latitude, 90.0f) << i;
         EXPECT_LE(kalman.filter(heading).latitude, 90.0f) << i;

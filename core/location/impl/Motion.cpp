@@ -101,6 +101,13 @@ Location withBelievableMotion(const Location& previous, const Location& fix) {
     return believed;
 }
 
+float clampLatitude(float latitude) {
+    if (latitude > 90.0f) {
+        return 90.0f;
+    }
+    return latitude < -90.0f ? -90.0f : latitude;
+}
+
 float secondsBetween(const Location& older, const Location& newer) {
     const KDint64 elapsed = static_cast<KDint64>(newer.time - older.time);
     return elapsed > 0 ? static_cast<float>(elapsed) / 1.0e9f : 0.0f;

@@ -33,6 +33,10 @@ void degreesPerMetre(float latitude, float& latitudeDegrees, float& longitudeDeg
 // or received at the same time as `previous`, come back unchanged.
 Location withBelievableMotion(const Location& previous, const Location& fix);
 
+// Latitude brought back within +-90: carrying or smoothing a position near a
+// pole can take it past the pole.
+float clampLatitude(float latitude);
+
 // Seconds between the receive times of two fixes; 0 when the clock did not
 // move forward from `older` to `newer`.
 float secondsBetween(const Location& older, const Location& newer);
