@@ -557,6 +557,8 @@ void ApplicationLife::createCollector(ByteScript& script) {
         return;
     }
     if (!collector) {
+        // The collector listens to the location manager, which starts network positioning.
+        locationManagerMade = true;
         collector.reset(new Statistics::NetworkCollector());
         collector->setUuid("chaos-client");
         collector->setModel("Chaos");
