@@ -92,12 +92,10 @@ Location withBelievableMotion(const Location& previous, const Location& fix) {
         return fix;
     }
     Location believed = fix;
-    believed.speed = moved / seconds;
-    const float dx = static_cast<float>(fix.x) - static_cast<float>(previous.x);
-    const float dy = static_cast<float>(fix.y) - static_cast<float>(previous.y);
-    believed.bearing = dx != 0.0f || dy != 0.0f ? BearingMath::bearingOf(dx, dy) : -1.0f;
-    CoordConversion::vMtovXY(believed.latitude, believed.speed, believed.speedXY);
-    believed.bearingXY = believed.bearing;
+    believed.speed = previous.speed;
+    believed.bearing = previous.bearing;
+    believed.speedXY = previous.speedXY;
+    believed.bearingXY = previous.bearingXY;
     return believed;
 }
 
