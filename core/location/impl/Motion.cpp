@@ -79,16 +79,20 @@ void degreesPerMetre(float latitude, float& latitudeDegrees, float& longitudeDeg
     longitudeDegrees = degreesPerRadian / (primeVertical * kdCosf(radians));
 }
 
-Location withBelievableMotion(const Location& previous, const Location& fix) {
+bool motionExplains(const Location& previous, const Location& fix) {
     const float seconds = secondsBetween(previous, fix);
     if (!hasSpeed(fix) || seconds <= 0.0f) {
-        return fix;
+        return true;
     }
     const float moved =
         CoordConversion::getDistance(previous.latitude, previous.longitude, fix.latitude, fix.longitude);
     const float unexplained = kdFabsf(fix.speed * seconds - moved);
     const float tolerance = previous.accuracy + fix.accuracy + kSpeedSlack * seconds;
-    if (!(unexplained > tolerance)) {
+    return !(unexplained > tolerance);
+}
+
+Location withBelievableMotion(const Location& previous, const Location& fix) {
+    if (motionExplains(previous, fix)) {
         return fix;
     }
     Location believed = fix;

@@ -33,6 +33,9 @@ void degreesPerMetre(float latitude, float& latitudeDegrees, float& longitudeDeg
 // previous's speed and bearing. Fixes without a speed, or received at the same
 // time as `previous`, come back unchanged.
 Location withBelievableMotion(const Location& previous, const Location& fix);
+// Whether the speed the fix reports can explain how far it moved since
+// `previous`; true when there is nothing to compare (no speed, no time).
+bool motionExplains(const Location& previous, const Location& fix);
 
 // Latitude brought back within +-90: carrying or smoothing a position near a
 // pole can take it past the pole.
