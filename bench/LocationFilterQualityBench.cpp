@@ -23,6 +23,15 @@
 // position is as far off as that one fix, and a mean over 3 fixes cannot take
 // out noise that is correlated over 5 s. That stage and the window are what
 // keep the marker still, and are kept as they are.
+//
+// No smoother may move the marker back by more than 5 m on any track, and
+// the Kalman filter should stay within 40 % of raw on tracks with independent
+// noise. It does while standing, walking and after the long stop, but not on
+// the three driving tracks (46-50 %): its first dozen fixes can do no better
+// than the mean of as many raw fixes, and afterwards it predicts by the
+// velocities the fixes report, whose noise (0.5 m/s, 3 degrees) it cannot
+// average out, as its state holds no velocity. Without the start the error is
+// near 40 %; a velocity in the state would be the next step.
 #include <benchmark/benchmark.h>
 #include <httplib.h>
 #include <pal/Simulation.h>
