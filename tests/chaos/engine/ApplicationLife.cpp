@@ -16,6 +16,7 @@
 #include "network/NetworkManager.h"
 #include "network/impl/NetworkManagerImpl.h"
 #include "redraw/ViewRedrawManager.h"
+#include "startup/StartupController.h"
 #include "startup/StartupData.h"
 #include "statistics/wifipool/NetworkCollector.h"
 #include "util/SingletonStorage.h"
@@ -86,6 +87,7 @@ const ApplicationLife::Step ApplicationLife::kSteps[] = {
     {"switch server answer", &ApplicationLife::switchServerAnswer},
     {"wait for answers", &ApplicationLife::waitForAnswers},
     {"hide a view not shown", &ApplicationLife::hideViewNotShown},
+    {"fetch startup", &ApplicationLife::fetchStartup},
     {"advance time", &ApplicationLife::advanceTime},
 };
 const int ApplicationLife::kStepCount = sizeof(kSteps) / sizeof(kSteps[0]);
@@ -172,7 +174,6 @@ void ApplicationLife::startApplication() {
     }
     app->setPauseHook([this](bool paused) { onAppPauseChanged(paused); });
     Startup::StartupData* startup = Startup::StartupData::getInstance();
-    startup->setHost(Startup::StartupData::HOST_STARTUP, server.host(ChaosServer::Ok));
     startup->uuid = "chaos-client";
     // The startup cycle has its own tests; here the answer is taken as received.
     startup->startupReady = true;
@@ -603,6 +604,7 @@ void ApplicationLife::setAnswer(ChaosServer::Answer value) {
     const std::string host = server.host(answer);
     Startup::StartupData* startup = Startup::StartupData::getInstance();
     startup->setHost(Startup::StartupData::HOST_DEFAULT, host);
+    startup->setHost(Startup::StartupData::HOST_STARTUP, host);
     startup->setHost(Startup::StartupData::HOST_CELLID, host);
     taskPool.setHost(host);
     if (collector) {
@@ -625,5 +627,15 @@ void ApplicationLife::hideViewNotShown(ByteScript&) {
     if (!expectedAssertion.empty()) {
         report.breach("hiding a view that is not shown did not assert");
         expectedAssertion.clear();
+    }
+}
+
+// The first call makes the controller, which fetches at once and on every
+// resume; later calls start a new cycle over a running one.
+void ApplicationLife::fetchStartup(ByteScript&) {
+    if (Startup::StartupController::getExistingInstance() == nullptr) {
+        Startup::StartupController::getInstance();
+    } else {
+        Startup::StartupController::getInstance()->fetchStartup();
     }
 }
