@@ -74,9 +74,12 @@ private:
     static const Step kSteps[];
     static const int kStepCount;
 
+    void playStep(const Step& step, ByteScript& script);
     void boot();
     void startApplication();
-    void drainAndShutDown();
+    void drain();
+    void finishHeldTasks();
+    void shutDown();
     void checkInvariants();
     void checkAssertions();
     void checkLeftovers();
