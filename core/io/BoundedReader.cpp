@@ -9,16 +9,17 @@ namespace IO {
 namespace {
 
 // Each step allocates at most this much beyond what has arrived.
-const std::size_t kStep = 64 * 1024;
+const long long kStep = 64 * 1024;
 
 // The bytes to ask for next: no more than the stream says it has (streams report a read past
-// their end as a fault), the step, or what is still wanted.
+// their end as a fault), than one step, or than is still wanted.
 std::size_t nextRequest(InputStream& stream, std::size_t wanted) {
     const long long left = stream.available();
     if (left <= 0) {
         return 0;
     }
-    return std::min<std::size_t>({static_cast<std::size_t>(std::min<long long>(left, kStep)), kStep, wanted});
+    const std::size_t step = static_cast<std::size_t>(std::min<long long>(left, kStep));
+    return std::min(step, wanted);
 }
 
 // Appends up to request bytes; the number that arrived.
