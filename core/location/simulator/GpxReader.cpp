@@ -2,6 +2,7 @@
 
 #include <tinyxml.h>
 
+#include <algorithm>
 #include <cstdio>
 #include <cstring>
 
@@ -201,7 +202,7 @@ bool GpxReader::parse(const std::vector<unsigned char>& bytes, std::vector<GpxPo
         error = "file too large";
         return false;
     }
-    if (std::memchr(bytes.data(), '\0', bytes.size()) != nullptr) {
+    if (std::find(bytes.begin(), bytes.end(), '\0') != bytes.end()) {
         error = "not a text file";
         return false;
     }
