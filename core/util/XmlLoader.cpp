@@ -119,8 +119,9 @@ void replaceMalformedUtf8(char* text) {
     }
 }
 
-bool tooLarge(const XmlLimits& limits, std::string& error) {
+bool tooLarge(const XmlLimits& limits, TiXmlDocument& doc, std::string& error) {
     error = "document larger than " + std::to_string(limits.maxBytes) + " bytes";
+    doc.SetError(TiXmlBase::TIXML_ERROR, nullptr, nullptr, TIXML_ENCODING_UNKNOWN);
     return false;
 }
 
@@ -130,10 +131,14 @@ bool parsePadded(std::vector<char>& text, const XmlLimits& limits, TiXmlDocument
     if (utf8) {
         replaceMalformedUtf8(text.data());
     }
-    if (!XmlPrescan::check(text.data(), limits, error)) {
+    const TiXmlEncoding encoding = utf8 ? TIXML_ENCODING_UTF8 : TIXML_ENCODING_LEGACY;
+    int errorId = TiXmlBase::TIXML_NO_ERROR;
+    if (!XmlPrescan::check(text.data(), limits, error, errorId)) {
+        // Callers that report the parser's error number (the positioning answer) keep one.
+        doc.SetError(errorId, nullptr, nullptr, encoding);
         return false;
     }
-    doc.Parse(text.data(), nullptr, utf8 ? TIXML_ENCODING_UTF8 : TIXML_ENCODING_LEGACY);
+    doc.Parse(text.data(), nullptr, encoding);
     if (doc.Error()) {
         error = std::string("not well-formed XML: ") + doc.ErrorDesc() + " at line " +
                 std::to_string(doc.ErrorRow()) + ", column " + std::to_string(doc.ErrorCol());
@@ -147,8 +152,9 @@ bool parsePadded(std::vector<char>& text, const XmlLimits& limits, TiXmlDocument
 bool XmlLoader::parse(const char* data, std::size_t size, const XmlLimits& limits, TiXmlDocument& doc,
                       std::string& error) {
     doc.Clear();
+    doc.ClearError();
     if (size > limits.maxBytes) {
-        return tooLarge(limits, error);
+        return tooLarge(limits, doc, error);
     }
     std::vector<char> text(size + kTerminatorPadding, '\0');
     if (size > 0) {
@@ -160,9 +166,10 @@ bool XmlLoader::parse(const char* data, std::size_t size, const XmlLimits& limit
 bool XmlLoader::load(IO::InputStream& stream, const XmlLimits& limits, TiXmlDocument& doc,
                      std::string& error) {
     doc.Clear();
+    doc.ClearError();
     std::vector<char> text;
     if (IO::BoundedReader::readAll(stream, limits.maxBytes, text) == IO::BoundedReader::TooLong) {
-        return tooLarge(limits, error);
+        return tooLarge(limits, doc, error);
     }
     text.resize(text.size() + kTerminatorPadding, '\0');
     return parsePadded(text, limits, doc, error);

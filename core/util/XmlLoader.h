@@ -22,7 +22,8 @@ namespace Util {
 class XmlLoader {
 public:
     // False with a reason in error when the text is refused or is not well-formed; the
-    // document's previous content is dropped either way.
+    // document's previous content is dropped either way, and a refused document reports an error
+    // (ErrorId()) as TinyXML would for the same fault, TIXML_ERROR for a limit.
     static bool parse(const char* data, std::size_t size, const XmlLimits& limits, TiXmlDocument& doc,
                       std::string& error);
     // Reads what the stream has left, growing with what arrives; a stream longer than

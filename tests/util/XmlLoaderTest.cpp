@@ -82,6 +82,7 @@ TEST(XmlLoaderTest, EachLimitRefusesTheDocumentThatPassesIt) {
         EXPECT_FALSE(parse(c.text, small(), doc, error)) << c.text.substr(0, 60);
         EXPECT_EQ(c.reason, error);
         EXPECT_EQ(nullptr, doc.RootElement());
+        EXPECT_EQ(TiXmlBase::TIXML_ERROR, doc.ErrorId());
     }
     const std::string atTheLimits[] = {
         repeat("<a>", 4) + repeat("</a>", 4),

@@ -1,5 +1,7 @@
 #include "util/impl/XmlPrescan.h"
 
+#include <tinyxml.h>
+
 #include <cstring>
 #include <vector>
 
@@ -36,8 +38,8 @@ struct Name {
 
 class Walker {
 public:
-    Walker(const char* text, const XmlLimits& limits, std::string& error)
-        : p(text), limits(limits), error(error), nodes(0), sawElement(false) {}
+    Walker(const char* text, const XmlLimits& limits, std::string& error, int& errorId)
+        : p(text), limits(limits), error(error), errorId(errorId), nodes(0), sawElement(false) {}
 
     bool run() {
         skipByteOrderMark();
@@ -53,13 +55,16 @@ public:
             } else if (isBlank(*p)) {
                 ++p;
             } else {
-                return fail("text outside the root element");
+                return fail("text outside the root element", sawElement
+                                                                 ? TiXmlBase::TIXML_ERROR_DOCUMENT_TOP_ONLY
+                                                                 : TiXmlBase::TIXML_ERROR_DOCUMENT_EMPTY);
             }
         }
         if (!open.empty()) {
-            return fail("element <" + nameText(open.back()) + "> is never closed");
+            return fail("element <" + nameText(open.back()) + "> is never closed",
+                        TiXmlBase::TIXML_ERROR_READING_END_TAG);
         }
-        return sawElement || fail("no element");
+        return sawElement || fail("no element", TiXmlBase::TIXML_ERROR_DOCUMENT_EMPTY);
     }
 
 private:
@@ -71,16 +76,16 @@ private:
 
     bool markup() {
         if (starts("<!--")) {
-            return skipPast(4, "-->", "comment") && addNode();
+            return skipPast(4, "-->", "comment", TiXmlBase::TIXML_ERROR_PARSING_COMMENT) && addNode();
         }
         if (starts("<![CDATA[")) {
-            return skipPast(9, "]]>", "CDATA section") && addNode();
+            return skipPast(9, "]]>", "CDATA section", TiXmlBase::TIXML_ERROR_PARSING_CDATA) && addNode();
         }
         if (starts("<?")) {
             return instruction() && addNode();
         }
         if (starts("<!")) {
-            return skipPast(2, ">", "declaration") && addNode();
+            return skipPast(2, ">", "declaration", TiXmlBase::TIXML_ERROR_PARSING_UNKNOWN) && addNode();
         }
         if (starts("</")) {
             return endTag();
@@ -98,7 +103,11 @@ private:
         ++p;
         const Name name = readName();
         if (name.length == 0) {
-            return fail("'<' not followed by an element name");
+            return fail("'<' not followed by an element name", TiXmlBase::TIXML_ERROR_PARSING_UNKNOWN);
+        }
+        if (*p == '\0') {
+            return fail("the text ends in the name <" + nameText(name),
+                        TiXmlBase::TIXML_ERROR_FAILED_TO_READ_ELEMENT_NAME);
         }
         int attributes = 0;
         for (;;) {
@@ -133,22 +142,26 @@ private:
 
     bool attribute() {
         if (readName().length == 0) {
-            return fail("malformed attribute");
+            return *p == '/' ? fail("'/' not followed by '>'", TiXmlBase::TIXML_ERROR_PARSING_EMPTY)
+                             : fail("malformed attribute", TiXmlBase::TIXML_ERROR_READING_ATTRIBUTES);
         }
         skipBlanks();
         if (*p != '=') {
-            return fail("attribute without '='");
+            return fail("attribute without '='", TiXmlBase::TIXML_ERROR_READING_ATTRIBUTES);
         }
         ++p;
         skipBlanks();
         if (*p != '"' && *p != '\'') {
-            return fail("attribute value not in quotes");
+            return fail("attribute value not in quotes", TiXmlBase::TIXML_ERROR_READING_ATTRIBUTES);
         }
         const char* close = std::strchr(p + 1, *p);
         if (!close) {
-            return fail("attribute value never ends");
+            return fail("attribute value never ends", TiXmlBase::TIXML_ERROR_PARSING_ELEMENT);
         }
         p = close + 1;
+        if (*p == '\0') {
+            return fail("the text ends in a start tag", TiXmlBase::TIXML_ERROR_PARSING_ELEMENT);
+        }
         return addNode();
     }
 
@@ -157,15 +170,17 @@ private:
         const Name name = readName();
         skipBlanks();
         if (*p != '>') {
-            return fail("malformed end tag");
+            return fail("malformed end tag", TiXmlBase::TIXML_ERROR_READING_END_TAG);
         }
         ++p;
         if (open.empty()) {
-            return fail("end tag </" + nameText(name) + "> without a start tag");
+            return fail("end tag </" + nameText(name) + "> without a start tag",
+                        TiXmlBase::TIXML_ERROR_PARSING_UNKNOWN);
         }
         const Name& expected = open.back();
         if (expected.length != name.length || std::memcmp(expected.start, name.start, name.length) != 0) {
-            return fail("end tag </" + nameText(name) + "> does not close <" + nameText(expected) + ">");
+            return fail("end tag </" + nameText(name) + "> does not close <" + nameText(expected) + ">",
+                        TiXmlBase::TIXML_ERROR_READING_END_TAG);
         }
         open.pop_back();
         return true;
@@ -178,7 +193,8 @@ private:
                 if (*q == quote) {
                     quote = '\0';
                 } else if (!isPlainValueByte(*q)) {
-                    return fail("processing instruction with a quoted value of spaces, quotes or brackets");
+                    return fail("processing instruction with a quoted value of spaces, quotes or brackets",
+                                TiXmlBase::TIXML_ERROR_PARSING_DECLARATION);
                 }
             } else if (*q == '"' || *q == '\'') {
                 quote = *q;
@@ -187,7 +203,7 @@ private:
                 return true;
             }
         }
-        return fail("processing instruction never ends");
+        return fail("processing instruction never ends", TiXmlBase::TIXML_ERROR_PARSING_DECLARATION);
     }
 
     Name readName() {
@@ -206,10 +222,10 @@ private:
         }
     }
 
-    bool skipPast(std::size_t opening, const char* marker, const char* what) {
+    bool skipPast(std::size_t opening, const char* marker, const char* what, int unendedError) {
         const char* found = std::strstr(p + opening, marker);
         if (!found) {
-            return fail(std::string(what) + " never ends");
+            return fail(std::string(what) + " never ends", unendedError);
         }
         p = found + std::strlen(marker);
         return true;
@@ -226,19 +242,23 @@ private:
 
     static std::string nameText(const Name& name) { return std::string(name.start, name.length); }
 
-    bool fail(const std::string& reason) {
+    bool fail(const std::string& reason, int tinyXmlError) {
         error = "not well-formed XML: " + reason;
+        errorId = tinyXmlError;
         return false;
     }
 
+    // The text may be well-formed; TinyXML's generic error stands for the refusal.
     bool overLimit(const std::string& reason) {
         error = reason;
+        errorId = TiXmlBase::TIXML_ERROR;
         return false;
     }
 
     const char* p;
     const XmlLimits& limits;
     std::string& error;
+    int& errorId;
     std::size_t nodes;
     bool sawElement;
     std::vector<Name> open;
@@ -246,8 +266,8 @@ private:
 
 }  // namespace
 
-bool XmlPrescan::check(const char* text, const XmlLimits& limits, std::string& error) {
-    return Walker(text, limits, error).run();
+bool XmlPrescan::check(const char* text, const XmlLimits& limits, std::string& error, int& errorId) {
+    return Walker(text, limits, error, errorId).run();
 }
 
 }  // namespace Util

@@ -15,8 +15,10 @@ namespace Util {
 // that TinyXML never steps over a byte of markup. Any thread.
 class XmlPrescan {
 public:
-    // text is zero-terminated and ends there, as for TinyXML. False with the reason in error.
-    static bool check(const char* text, const XmlLimits& limits, std::string& error);
+    // text is zero-terminated and ends there, as for TinyXML. False with the reason in error and
+    // in errorId the TinyXML error number that TinyXML gives the same fault where it reads the
+    // fault alike (TIXML_ERROR for a limit).
+    static bool check(const char* text, const XmlLimits& limits, std::string& error, int& errorId);
 };
 
 }  // namespace Util
