@@ -24,8 +24,10 @@ FUZZ_DIR ?= build-fuzz
 FUZZ_SECONDS ?= 60
 # make cross-test ARCH=arm64|armhf: cross-build in build-cross-ARCH and run the tests under qemu.
 ARCH ?= arm64
+# make tsan-test: the areas whose code crosses threads, under ThreadSanitizer in build-tsan.
+TSAN_AREAS ?= pal tasking http network
 
-.PHONY: deps configure build test demo bench fuzz-build fuzz fuzz-replay cross-test clean
+.PHONY: deps configure build test tsan-test demo bench fuzz-build fuzz fuzz-replay cross-test clean
 
 deps:
 	@bash scripts/install-deps.sh
@@ -39,6 +41,10 @@ build: configure
 test: build
 	@ctest --test-dir $(BUILD_DIR) --output-on-failure -j $(JOBS) \
 	  $(if $(AREAS),-L '^($(subst $(space),|,$(strip $(AREAS))))$$')
+
+tsan-test:
+	@$(MAKE) --no-print-directory test BUILD_DIR=build-tsan AREAS="$(TSAN_AREAS)" \
+	  CMAKE_ARGS="-DMAPCORE_SANITIZE=thread -DMAPCORE_BENCHMARKS=OFF"
 
 demo: build
 	@$(BUILD_DIR)/examples/demo/mapcore_demo
