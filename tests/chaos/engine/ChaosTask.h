@@ -31,7 +31,8 @@ public:
 
     struct Settings {
         int priority = 1;
-        std::string url;
+        // Read at each attempt, as applications build a URL from the host known at that time.
+        boost::shared_ptr<const std::string> url;
         bool byParts = false;
         bool ready = true;
         Reentry reentry = NoReentry;

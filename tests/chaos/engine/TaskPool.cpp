@@ -23,10 +23,15 @@ Network::NetworkManager* manager() {
 
 }  // namespace
 
-TaskPool::TaskPool(InvariantReport& report) : report(report), slots(kSlots) {}
+TaskPool::TaskPool(InvariantReport& report)
+    : report(report), url(boost::make_shared<std::string>()), slots(kSlots) {}
 
 TaskPool::~TaskPool() {
     releaseAll();
+}
+
+void TaskPool::setHost(const std::string& host) {
+    *url = host + ChaosServer::kTaskPath;
 }
 
 void TaskPool::submit(ByteScript& script) {
@@ -36,7 +41,7 @@ void TaskPool::submit(ByteScript& script) {
     settings.byParts = script.chance(2);
     settings.ready = !script.chance(6);
     settings.reentry = static_cast<ChaosTask::Reentry>(script.pick(ChaosTask::ReentryCount));
-    settings.url = host + ChaosServer::kTaskPath;
+    settings.url = url;
     const int policy = script.pick(PolicyCount);
     if (!slots[slot]) {
         submitInto(slot, settings, policy);
@@ -93,6 +98,24 @@ void TaskPool::makeReady(ByteScript& script) {
     }
 }
 
+void TaskPool::readyAll() {
+    for (const boost::shared_ptr<ChaosTask>& task : slots) {
+        if (task) {
+            task->setReady(true);
+        }
+    }
+}
+
+int TaskPool::unfinishedCount() const {
+    int count = 0;
+    for (const boost::shared_ptr<ChaosTask>& task : slots) {
+        if (task && !task->isCancelled() && !task->hasFinished()) {
+            ++count;
+        }
+    }
+    return count;
+}
+
 void TaskPool::releaseAll() {
     for (int slot = 0; slot < kSlots; ++slot) {
         cancelSlot(slot);
@@ -127,7 +150,7 @@ void TaskPool::onReentry(ChaosTask& task, ChaosTask::Reentry reentry) {
             // A finished task frees its slot for the follow-up it asks for.
             slots[slot].reset();
             ChaosTask::Settings followUp;
-            followUp.url = host + ChaosServer::kTaskPath;
+            followUp.url = url;
             submitInto(slot, followUp, SingleAttempt);
             break;
         }

@@ -19,8 +19,8 @@ public:
     explicit TaskPool(InvariantReport& report);
     ~TaskPool();
 
-    // The host tasks submitted from now on ask, "http://.../" with a final slash.
-    void setHost(const std::string& value) { host = value; }
+    // The host every task asks from its next attempt on, "http://.../" with a final slash.
+    void setHost(const std::string& value);
 
     // Each reads its slot and settings from the script.
     void submit(ByteScript& script);
@@ -28,6 +28,9 @@ public:
     void release(ByteScript& script);
     void makeReady(ByteScript& script);
 
+    void readyAll();
+    // Tasks held, not cancelled, and not finished yet.
+    int unfinishedCount() const;
     // Cancels and drops every task.
     void releaseAll();
     std::size_t bufferedBytes() const;
@@ -42,6 +45,7 @@ private:
     int slotOf(const ChaosTask& task) const;
 
     InvariantReport& report;
-    std::string host;
+    // Shared with the tasks, which read it at each attempt.
+    boost::shared_ptr<std::string> url;
     std::vector<boost::shared_ptr<ChaosTask> > slots;
 };
