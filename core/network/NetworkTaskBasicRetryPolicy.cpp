@@ -1,6 +1,12 @@
 #include "network/NetworkTaskBasicRetryPolicy.h"
 
+#include <KD/kd.h>
+
+#include <algorithm>
+
+#include "network/HttpResponse.h"
 #include "network/NetworkErrorCodes.h"
+#include "network/RetryAfter.h"
 
 namespace Network {
 
@@ -8,11 +14,17 @@ namespace {
 
 const long long kNanosPerMilli = 1000000ll;
 const long long kTimeoutPerRetryNs = 30000000000ll;
+const int kServiceUnavailable = 503;
+const int kTooManyRequests = 429;
 
 }  // namespace
 
 NetworkTaskBasicRetryPolicy::NetworkTaskBasicRetryPolicy(int retryInterval, int maxRetries,
                                                          bool useTaskTimeout)
+    : NetworkTaskBasicRetryPolicy(retryInterval, maxRetries, useTaskTimeout, RetryJitter::seedFromClock()) {}
+
+NetworkTaskBasicRetryPolicy::NetworkTaskBasicRetryPolicy(int retryInterval, int maxRetries,
+                                                         bool useTaskTimeout, unsigned long long jitterSeed)
     : statusCode(0),
       retryInterval(retryInterval),
       maxRetries(maxRetries),
@@ -20,7 +32,10 @@ NetworkTaskBasicRetryPolicy::NetworkTaskBasicRetryPolicy(int retryInterval, int 
       retryTimer(
           new Util::Timer(callback<void (*)()>::make<NetworkTaskBasicRetryPolicy,
                                                      &NetworkTaskBasicRetryPolicy::onRetryTimerFired>(this))),
-      subscribed(false) {
+      subscribed(false),
+      backoffStep(0),
+      retryAfterMs(-1),
+      jitter(jitterSeed) {
     if (useTaskTimeout) {
         taskTimeoutTimer.reset(
             new Util::Timer(callback<void (*)()>::make<NetworkTaskBasicRetryPolicy,
@@ -51,6 +66,18 @@ void NetworkTaskBasicRetryPolicy::onSubmit(OnRequestTimeoutCallback onTimeout) {
 
 void NetworkTaskBasicRetryPolicy::onStatusCodeRecieved(int code) {
     statusCode = code;
+    retryAfterMs = -1;
+}
+
+void NetworkTaskBasicRetryPolicy::onResponseRecieved(const HttpResponse& response) {
+    const int status = response.getStatusCode();
+    if (status != kServiceUnavailable && status != kTooManyRequests) {
+        return;
+    }
+    long long delayMs = 0;
+    if (RetryAfter::parse(response.getHeader("Retry-After"), kdTime(nullptr), delayMs)) {
+        retryAfterMs = delayMs;
+    }
 }
 
 bool NetworkTaskBasicRetryPolicy::isRetryCondition() const {
@@ -59,6 +86,10 @@ bool NetworkTaskBasicRetryPolicy::isRetryCondition() const {
     }
     if (statusCode == 408) {
         return true;
+    }
+    // Without a time to come back, a 429 stays the final answer.
+    if (statusCode == kTooManyRequests) {
+        return retryAfterMs >= 0;
     }
     return statusCode < 200 || statusCode >= 500;
 }
@@ -79,7 +110,34 @@ void NetworkTaskBasicRetryPolicy::performRetry(OnRetryCallback onRetry) {
         subscribe();
         return;
     }
-    retryTimer->start(Util::Timer::OneShot, retryInterval * kNanosPerMilli);
+    retryTimer->start(Util::Timer::OneShot, nextWaitMs() * kNanosPerMilli);
+}
+
+long long NetworkTaskBasicRetryPolicy::nextWaitMs() {
+    if (retryAfterMs >= 0) {
+        const long long longest = std::max<long long>(retryInterval, MAX_RETRY_AFTER_MS);
+        return std::min(std::max<long long>(retryAfterMs, retryInterval), longest);
+    }
+    if (maxRetries != -1) {
+        return retryInterval;
+    }
+    const long long ceiling = backoffCeilingMs();
+    // Past the cap (or with no interval to double) the step stops counting.
+    if (ceiling > 0 && ceiling < MAX_BACKOFF_INTERVAL_MS) {
+        ++backoffStep;
+    }
+    return jitter.between(retryInterval, ceiling);
+}
+
+// The interval doubled once per failure waited out, held at the cap (or at
+// the interval itself when that is longer).
+long long NetworkTaskBasicRetryPolicy::backoffCeilingMs() const {
+    const long long cap = std::max<long long>(retryInterval, MAX_BACKOFF_INTERVAL_MS);
+    long long ceiling = retryInterval;
+    for (int step = 0; step < backoffStep && ceiling > 0 && ceiling < cap; ++step) {
+        ceiling *= 2;
+    }
+    return std::min(ceiling, cap);
 }
 
 void NetworkTaskBasicRetryPolicy::onRetryTimerFired() {
@@ -100,6 +158,9 @@ void NetworkTaskBasicRetryPolicy::onNetworkReachabilityChanged(
         return;
     }
     unsubscribe();
+    // The failures were ours, not the server's: a fresh network starts the
+    // waits from the first interval again.
+    backoffStep = 0;
     retryCallback(shared_from_this());
 }
 

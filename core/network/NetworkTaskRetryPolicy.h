@@ -6,6 +6,8 @@
 
 namespace Network {
 
+class HttpResponse;
+
 // Decides, after each failed attempt of a task, whether and when it runs
 // again, and may bound the whole task with a timeout. One per submission,
 // owned by the task's running state; called on the task's caller thread.
@@ -19,6 +21,9 @@ public:
     virtual void onSubmit(OnRequestTimeoutCallback onTimeout) = 0;
     // Every HTTP status and every non-zero finish code of an attempt.
     virtual void onStatusCodeRecieved(int code) = 0;
+    // Every response, after its status: a policy may read how long the
+    // server asks it to wait.
+    virtual void onResponseRecieved(const HttpResponse& response) { (void)response; }
     virtual bool isRetryCondition() const = 0;
     virtual bool isNeedRetry() const = 0;
     // Called when isNeedRetry() holds; onRetry starts the next attempt.

@@ -47,7 +47,12 @@ std::string StartupRequest::buildUrl() const {
 boost::shared_ptr<Network::HttpRequest> StartupRequest::issueRequest() const {
     const std::string url = buildUrl();
     kdLogMessage(url.c_str());
-    return Network::HttpRequest::create(url.c_str(), "GET", kTimeoutMs, false);
+    boost::shared_ptr<Network::HttpRequest> request =
+        Network::HttpRequest::create(url.c_str(), "GET", kTimeoutMs, false);
+    // The query carries the device's identity: it may move within its host,
+    // or to https, but goes nowhere else.
+    request->setRedirectPolicy(Network::HttpRequest::SameHostRedirects);
+    return request;
 }
 
 void StartupRequest::onBytesReceived(const std::vector<unsigned char>& bytes) {

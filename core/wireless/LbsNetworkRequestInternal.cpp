@@ -44,7 +44,12 @@ boost::shared_ptr<Network::HttpRequest> LbsNetworkRequestInternal::issueRequest(
     // The uuid comes from a server: escaped, it cannot add parameters.
     const std::string url = startupData->getHost(Startup::StartupData::HOST_CELLID) + kLocationPath +
                             "?uuid=" + Util::UrlCoder::urlEncodeString(startupData->uuid) + owner->getQuery();
-    return Network::HttpRequest::create(url.c_str(), "GET", kRequestTimeoutMs, false);
+    boost::shared_ptr<Network::HttpRequest> request =
+        Network::HttpRequest::create(url.c_str(), "GET", kRequestTimeoutMs, false);
+    // The query says where the device is: it may move within its host, or to
+    // https, but goes nowhere else.
+    request->setRedirectPolicy(Network::HttpRequest::SameHostRedirects);
+    return request;
 }
 
 void LbsNetworkRequestInternal::onResponseRecieved(boost::shared_ptr<Network::HttpResponse> response) {

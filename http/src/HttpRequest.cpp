@@ -21,7 +21,7 @@ HttpRequest::HttpRequest(const char* url, const char* method, int timeoutMs, boo
     : url(url != nullptr ? url : ""),
       method(method != nullptr ? method : ""),
       timeoutMs(timeoutMs),
-      followRedirects(followRedirects),
+      redirectPolicy(followRedirects ? AnyRedirect : NoRedirects),
       fixedBody(false),
       mutex(kdThreadMutexCreate(nullptr)) {
     KD_ASSERT(url != nullptr && method != nullptr);

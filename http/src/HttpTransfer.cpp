@@ -50,6 +50,51 @@ bool isFollowedRedirect(int statusCode) {
     return isRedirect(statusCode) && statusCode != 304;
 }
 
+std::string urlPart(CURLU* url, CURLUPart part) {
+    char* text = nullptr;
+    if (curl_url_get(url, part, &text, 0) != CURLUE_OK) {
+        return std::string();
+    }
+    std::string copy(text);
+    curl_free(text);
+    return copy;
+}
+
+// Why a redirect from base to location leaves the host of base, or null when
+// it stays; target is then the absolute URL it leads to. Resolved the way
+// libcurl resolves it to follow.
+const char* sameHostRefusal(const std::string& base, const std::string& location, std::string& target) {
+    CURLU* url = curl_url();
+    if (url == nullptr) {
+        return "out of memory";
+    }
+    std::string fromScheme, fromHost, toScheme, toHost;
+    if (curl_url_set(url, CURLUPART_URL, base.c_str(), 0) == CURLUE_OK) {
+        fromScheme = urlPart(url, CURLUPART_SCHEME);
+        fromHost = urlPart(url, CURLUPART_HOST);
+        if (curl_url_set(url, CURLUPART_URL, location.c_str(), CURLU_URLENCODE | CURLU_ALLOW_SPACE) ==
+            CURLUE_OK) {
+            toScheme = urlPart(url, CURLUPART_SCHEME);
+            toHost = urlPart(url, CURLUPART_HOST);
+            target = urlPart(url, CURLUPART_URL);
+        }
+    }
+    curl_url_cleanup(url);
+    if (fromHost.empty() || toHost.empty() || target.empty()) {
+        return "not a URL";
+    }
+    if (strcasecmp(fromHost.c_str(), toHost.c_str()) != 0) {
+        return "it leaves the host";
+    }
+    const bool sameScheme = strcasecmp(fromScheme.c_str(), toScheme.c_str()) == 0;
+    const bool upgrade =
+        strcasecmp(fromScheme.c_str(), "http") == 0 && strcasecmp(toScheme.c_str(), "https") == 0;
+    if (!sameScheme && !upgrade) {
+        return "it leaves https";
+    }
+    return nullptr;
+}
+
 bool containsNoCase(const std::string& text, const std::string& word) {
     return std::search(text.begin(), text.end(), word.begin(), word.end(), [](char a, char b) {
                return std::tolower(static_cast<unsigned char>(a)) ==
@@ -125,6 +170,7 @@ HttpTransfer::HttpTransfer(const boost::shared_ptr<HttpRequest>& request, int id
                                          : request->findBodyStream()),
       requestSize(0),
       handle(nullptr),
+      currentUrl(request->getUrl()),
       headerList(nullptr),
       uploadOffset(0),
       uploadPaused(false),
@@ -198,7 +244,7 @@ bool HttpTransfer::open(CURL* curl) {
     // URLs come partly from servers (host table, redirects): nothing but HTTP.
     curl_easy_setopt(handle, CURLOPT_PROTOCOLS_STR, "http,https");
     curl_easy_setopt(handle, CURLOPT_REDIR_PROTOCOLS_STR, "http,https");
-    curl_easy_setopt(handle, CURLOPT_FOLLOWLOCATION, request->getFollowRedirects() ? 1L : 0L);
+    curl_easy_setopt(handle, CURLOPT_FOLLOWLOCATION, followsRedirects() ? 1L : 0L);
     curl_easy_setopt(handle, CURLOPT_MAXREDIRS, kMaxRedirects);
     if (request->getTimeoutMs() > 0) {
         curl_easy_setopt(handle, CURLOPT_CONNECTTIMEOUT_MS, static_cast<long>(request->getTimeoutMs()));
@@ -480,8 +526,10 @@ bool HttpTransfer::headEnded() {
         return false;
     }
     bool hasLocation = !answer.getHeader("Location").empty();
-    bool following = request->getFollowRedirects() && isRedirect(statusCode) && hasLocation;
-    skippingBlock = following && isFollowedRedirect(statusCode);
+    bool following = followsRedirects() && isRedirect(statusCode) && hasLocation;
+    // A redirect refused stops the transfer at this head, which becomes the
+    // response.
+    skippingBlock = following && isFollowedRedirect(statusCode) && mayFollow(answer.getHeader("Location"));
     if (skippingBlock) {
         return true;
     }
@@ -494,6 +542,25 @@ bool HttpTransfer::headEnded() {
     // answer is complete and stays the only one.
     stoppedAfterAnswer = following;
     return !stoppedAfterAnswer;
+}
+
+bool HttpTransfer::followsRedirects() const {
+    return request->getRedirectPolicy() != HttpRequest::NoRedirects;
+}
+
+bool HttpTransfer::mayFollow(const std::string& location) {
+    if (request->getRedirectPolicy() != HttpRequest::SameHostRedirects) {
+        return true;
+    }
+    std::string target;
+    const char* refusal = sameHostRefusal(currentUrl, location, target);
+    if (refusal != nullptr) {
+        kdLogFormatMessage("HttpConnection %d: not following the redirect to %s: %s", id, location.c_str(),
+                           refusal);
+        return false;
+    }
+    currentUrl = target;
+    return true;
 }
 
 void HttpTransfer::deliverResponse() {

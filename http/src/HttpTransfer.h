@@ -99,6 +99,10 @@ private:
     bool hasRequestLeft() const;
     // False when the transfer must stop at this head.
     bool headEnded();
+    bool followsRedirects() const;
+    // Whether the redirect to location is followed under the request's
+    // policy; a refusal is logged.
+    bool mayFollow(const std::string& location);
     void deliverResponse();
     size_t receiveBody(char* data, size_t length);
     void keepWholeBody(const unsigned char* bytes, size_t length);
@@ -127,6 +131,8 @@ private:
 
     // Engine thread only.
     CURL* handle;
+    // The URL of the hop under way, against which a Location is resolved.
+    std::string currentUrl;
     curl_slist* headerList;
     char errorText[CURL_ERROR_SIZE];
     std::size_t uploadOffset;

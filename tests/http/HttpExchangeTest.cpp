@@ -230,6 +230,53 @@ TEST_F(HttpExchangeTest, RedirectsAreFollowedOnlyWhenAsked) {
     EXPECT_EQ(1, targetRequests);
 }
 
+TEST_F(HttpExchangeTest, SameHostRedirectsStayOnTheHostOrGoToHttpsAndOthersAreHandedOverAndLogged) {
+    const std::string port = std::to_string(server->port());
+    auto redirect = [&](const std::string& path, const std::string& location) {
+        Reply moved;
+        moved.status = 301;
+        moved.body = "moved";
+        moved.headers = {{"Location", location}};
+        server->on(path, moved);
+        return server->url(path);
+    };
+    auto sameHostOnly = [](const std::string& url) {
+        boost::shared_ptr<HttpRequest> request = Recorder::get(url);
+        request->setRedirectPolicy(HttpRequest::SameHostRedirects);
+        return request;
+    };
+    serve("/target", Reply::Whole, "arrived");
+    redirect("/hop", "/target");
+    Recorder relative(sameHostOnly(redirect("/relative", "hop")));
+    Recorder absolute(sameHostOnly(redirect("/absolute", "http://127.0.0.1:" + port + "/target")));
+    // The name leads to the same server, but it is another host.
+    Recorder otherHost(sameHostOnly(redirect("/away", "http://localhost:" + port + "/target")));
+    Recorder upgraded(sameHostOnly(redirect("/secure", "https://127.0.0.1:" + port + "/target")));
+    Recorder nonsense(sameHostOnly(redirect("/nonsense", "http://")));
+    ASSERT_TRUE(Recorder::runAll({&relative, &absolute, &otherHost, &upgraded, &nonsense}));
+
+    for (Recorder* followed : {&relative, &absolute}) {
+        EXPECT_EQ((std::vector<std::string>{"response", "body", "finished"}), followed->events);
+        EXPECT_EQ(200, followed->status());
+        EXPECT_EQ("arrived", followed->body);
+    }
+    for (Recorder* refused : {&otherHost, &nonsense}) {
+        EXPECT_EQ(0, refused->code);
+        EXPECT_EQ(301, refused->status());
+    }
+    EXPECT_EQ(1, countLogLines("not following the redirect to http://localhost:" + port +
+                               "/target: it leaves the host"));
+    EXPECT_EQ(1, countLogLines("not following the redirect to http://: not a URL"));
+    // Followed: the plain server cannot speak TLS, so the upgraded hop fails there.
+    EXPECT_EQ(Network::HTTP_TLS_ERROR_CODE, upgraded.code);
+    EXPECT_EQ(2, countLogLines("not following the redirect"));
+    int targetRequests = 0;
+    for (const TestHttpServer::Received& received : server->received()) {
+        targetRequests += received.path == "/target" ? 1 : 0;
+    }
+    EXPECT_EQ(2, targetRequests);
+}
+
 TEST_F(HttpExchangeTest, PartsWaitingForASlowCallerHoldTheTransferBack) {
     const std::string body = patternBody(2 * 1024 * 1024);
     boost::shared_ptr<RecordingCollector> collector = boost::make_shared<RecordingCollector>();

@@ -214,6 +214,35 @@ TEST_F(StartupControllerTest, BodyThatIsNotXmlEndsTheCycleUntilTheNextResume) {
     ASSERT_TRUE(runUntil([this] { return listener->readyCount == 1; }));
 }
 
+TEST_F(StartupControllerTest, ARedirectIsFollowedOnTheStartupHostOnlyAndAnyOtherIsLogged) {
+    StartupData::getInstance()->uuid = "known";
+    TestHttpServer::Reply moved;
+    moved.status = 302;
+    moved.headers = {{"Location", "/v2/startup"}};
+    server.on("/startup", moved);
+    TestHttpServer::Reply answer;
+    answer.body = answerWith("<uuid>known</uuid><query_hosts/>");
+    answer.contentType = "text/xml";
+    server.on("/v2/startup", answer);
+    makeController();
+    resume();
+    ASSERT_TRUE(runUntil([this] { return listener->readyCount == 1; }));
+
+    const std::string elsewhere = "http://localhost:" + std::to_string(server.port()) + "/v2/startup";
+    moved.headers = {{"Location", elsewhere}};
+    server.on("/startup", moved);
+    resume();
+    ASSERT_TRUE(runUntil([this] { return startupRequests() == 2; }));
+    settle();
+    EXPECT_EQ(1, listener->readyCount);
+    EXPECT_EQ(1, countLogLines("not following the redirect to " + elsewhere + ": it leaves the host"));
+    int moves = 0;
+    for (const TestHttpServer::Received& received : server.received()) {
+        moves += received.path == "/v2/startup" ? 1 : 0;
+    }
+    EXPECT_EQ(1, moves);
+}
+
 TEST_F(StartupControllerTest, AnswersWithoutIdentifierAskAtMostOnceMore) {
     serve(answerWith("<query_hosts/>"));
     makeController();

@@ -186,6 +186,32 @@ TEST_F(LbsNetworkRequestTest, FailedExchangesReportOnce) {
     EXPECT_EQ(1, submitAndWait().error);
 }
 
+TEST_F(LbsNetworkRequestTest, ARedirectIsFollowedOnThePositioningHostOnlyAndAnyOtherIsLogged) {
+    TestHttpServer::Reply moved;
+    moved.status = 307;
+    moved.body = "moved";
+    moved.headers = {{"Location", "/v2/position"}};
+    server.on(kPath, moved);
+    TestHttpServer::Reply position;
+    position.body = located("52.5", "13.25", "35.5");
+    position.contentType = "text/xml";
+    server.on("/v2/position", position);
+    const LbsNetworkRequest::Response followed = submitAndWait();
+    EXPECT_EQ(0, followed.error);
+    EXPECT_FLOAT_EQ(35.5f, followed.accuracy);
+
+    const std::string elsewhere = "http://localhost:" + std::to_string(server.port()) + "/v2/position";
+    moved.headers = {{"Location", elsewhere}};
+    server.on(kPath, moved);
+    EXPECT_EQ(307, submitAndWait().error);
+    EXPECT_EQ(1, countLogLines("not following the redirect to " + elsewhere + ": it leaves the host"));
+    int moves = 0;
+    for (const TestHttpServer::Received& received : server.received()) {
+        moves += received.path == "/v2/position" ? 1 : 0;
+    }
+    EXPECT_EQ(1, moves);
+}
+
 TEST_F(LbsNetworkRequestTest, ANewSubmitOrCancelSilencesTheRunningQuery) {
     Network::NetworkManager* manager = Network::NetworkManager::getInstance();
     TestHttpServer::Reply stall;

@@ -156,6 +156,7 @@ void NetworkTaskImpl::onResponseRecieved(boost::shared_ptr<HttpConnection>,
     responseReceived = true;
     statusCode = response->getStatusCode();
     retryPolicy->onStatusCodeRecieved(statusCode);
+    retryPolicy->onResponseRecieved(*response);
     task->onResponseRecieved(response);
 }
 

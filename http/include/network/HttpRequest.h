@@ -23,10 +23,19 @@ public:
 
     typedef std::vector<std::pair<std::string, std::string> > Headers;
 
+    // Which 3xx answers are followed instead of being handed over as the
+    // response (up to 10 hops, http and https only).
+    enum RedirectPolicy {
+        NoRedirects,
+        AnyRedirect,
+        // Only to the host of the request, keeping its scheme or going from
+        // http to https. Any other redirect is logged and handed over.
+        SameHostRedirects
+    };
+
     // timeoutMs: the longest wait for connecting and, afterwards, for any byte
     // to move in either direction; 0 or less waits forever.
-    // followRedirects: 3xx answers are followed (up to 10 hops, http and https
-    // only) instead of being handed over as the response.
+    // followRedirects: AnyRedirect when true, NoRedirects when false.
     static boost::shared_ptr<HttpRequest> create(const char* url, const char* method, int timeoutMs,
                                                  bool followRedirects);
     ~HttpRequest();
@@ -40,11 +49,12 @@ public:
     boost::shared_ptr<HttpBodyStream> getBodyStream();
     // Adds a request header; names and values must not contain line breaks.
     void addHeader(const std::string& name, const std::string& value);
+    void setRedirectPolicy(RedirectPolicy policy) { redirectPolicy = policy; }
 
     const std::string& getUrl() const { return url; }
     const std::string& getMethod() const { return method; }
     int getTimeoutMs() const { return timeoutMs; }
-    bool getFollowRedirects() const { return followRedirects; }
+    RedirectPolicy getRedirectPolicy() const { return redirectPolicy; }
     const Headers& getHeaders() const { return headers; }
     bool hasFixedBody() const { return fixedBody; }
     const std::string& getFixedBody() const { return body; }
@@ -59,7 +69,7 @@ private:
     std::string url;
     std::string method;
     int timeoutMs;
-    bool followRedirects;
+    RedirectPolicy redirectPolicy;
     Headers headers;
     bool fixedBody;
     std::string body;
