@@ -202,6 +202,10 @@ std::vector<Track> makeTracks(double correlation) {
                                            {5, 6.0, 45.0},
                                            {40, 15.0, 90.0}}),
                                {3.0, 8.0f, 0.5, 3.0, 0.0}, correlation, 3));
+    // A receiver noisier than it claims: 6 m of noise at 10 m accuracy.
+    tracks.push_back(makeTrack("walking, noisier receiver", "noisy",
+                               followLegs(lat, lon, {{120, 1.4, 20.0}}), {6.0, 10.0f, 0.3, 12.0, 0.0},
+                               correlation, 29));
     Track outliers = makeTrack("walking, 150 m outliers", "outliers",
                                followLegs(lat, lon, {{200, 1.4, 45.0}, {100, 1.4, 135.0}}),
                                {4.0, 10.0f, 0.3, 12.0, 0.0}, correlation, 4);
@@ -229,6 +233,22 @@ std::vector<Track> makeTracks(double correlation) {
         spike.raw[i].initFromRaw();
     }
     tracks.push_back(spike);
+
+    // Stop and go: speeding up from standing to 14 m/s and braking again at
+    // 2 m/s squared, twice, as a steady filter must follow.
+    std::vector<Leg> stopAndGo;
+    for (int round = 0; round < 2; ++round) {
+        stopAndGo.push_back({10, 0.0, 90.0});
+        for (int s = 1; s <= 7; ++s) {
+            stopAndGo.push_back({1, 2.0 * s, 90.0});
+        }
+        stopAndGo.push_back({20, 14.0, 90.0});
+        for (int s = 6; s >= 1; --s) {
+            stopAndGo.push_back({1, 2.0 * s, 90.0});
+        }
+    }
+    stopAndGo.push_back({10, 0.0, 90.0});
+    tracks.push_back(makeTrack("stop and go", "stopandgo", followLegs(lat, lon, stopAndGo), car, correlation, 10));
 
     // The receiver's own clock steps back a minute mid-drive and goes on
     // from there.
