@@ -192,11 +192,12 @@ bool BaseView::onViewResumed() {
     }
     kdGFXSetRedrawHandler(this, &BaseView::handleRedraw);
     updateSize();
-    Redraw::ViewRedrawManager* manager = getRedrawManager();
-    if (manager != nullptr) {
-        manager->scheduleUpdate();
-        manager->scheduleRedraw();
+    // onSizeChanged() may have hidden this view: it stays paused then.
+    if (redrawManager == nullptr) {
+        return false;
     }
+    redrawManager->scheduleUpdate();
+    redrawManager->scheduleRedraw();
     isViewPaused = false;
     return true;
 }
@@ -209,7 +210,9 @@ void BaseView::resumeIfViewRunning() {
     // The order of the event's fan-out: the view registered before its
     // redraw manager.
     onViewResumed();
-    redrawManager->onViewResumed();
+    if (redrawManager != nullptr) {
+        redrawManager->onViewResumed();
+    }
 }
 
 void BaseView::onKey(int key, int, int) {

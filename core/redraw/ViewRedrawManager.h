@@ -53,6 +53,7 @@ private:
 
     static KDint64 now();
     void rollCounterWindow(KDint64 time);
+    static void reportDestroyed(bool* outerTick);
 
     ViewRedrawManagerDelegate& delegate;
     boost::shared_ptr<Lifecycle::PauseResumeListenerWrapper> pauseResumeListenerWrapper;
@@ -69,6 +70,9 @@ private:
     bool updateScheduled;
     bool redrawScheduled;
     bool isViewPaused;
+    // Set by the destructor when a delegate call destroyed this manager (the
+    // application hid the view from update or redraw); null outside tick().
+    bool* destroyedDuringTick;
 };
 
 }  // namespace Redraw
