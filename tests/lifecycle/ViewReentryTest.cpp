@@ -3,6 +3,7 @@
 // it nor the view may be touched as if it still ran (ASan finds the rest).
 #include <KD/kdext.h>
 #include <pal/Simulation.h>
+#include <pal/SimulationInput.h>
 
 #include <boost/scoped_ptr.hpp>
 #include <string>
@@ -47,16 +48,41 @@ public:
             switchAway();
         }
     }
-    void draw() override { note("draw"); }
+    void draw() override {
+        note("draw");
+        if (hideIn == "draw") {
+            switchAway();
+        }
+    }
     void onViewEvent106() override {}
-    void onViewEvent104() override {}
-    void onPointerPressed(int, int) override {}
-    void onPointerReleased(int, int) override {}
+    void onViewEvent104() override {
+        note("event104");
+        if (hideIn == "event104") {
+            switchAway();
+        }
+    }
+    void onPointerPressed(int, int) override {
+        note("pressed");
+        if (hideIn == "pressed") {
+            switchAway();
+        }
+    }
+    void onPointerReleased(int, int) override { note("released"); }
     void onPointerMoved(int, int) override {}
-    void onGesture(const KDEventData*) override {}
+    void onKey(int key, int x, int y) override {
+        note("key");
+        if (hideIn == "key") {
+            switchAway();
+            return;
+        }
+        BaseView::onKey(key, x, y);
+    }
+    void onGesture(const KDEventData*) override { note("gesture"); }
 
     std::string hideIn;
     HidingView* next = nullptr;
+    // Set: the view is deleted through it right after it hid itself.
+    boost::scoped_ptr<HidingView>* owner = nullptr;
 
 private:
     void note(const std::string& what) { journal->push_back(name + " " + what); }
@@ -66,6 +92,10 @@ private:
         note("hidden");
         if (next != nullptr) {
             TestApp::get()->showView(next);
+        }
+        if (owner != nullptr) {
+            journal->push_back(name + " deleted");
+            owner->reset();
         }
     }
 
@@ -83,7 +113,7 @@ protected:
 
     void TearDown() override {
         for (HidingView* view : {first.get(), second.get()}) {
-            if (view->getResourceManager() != nullptr) {
+            if (view != nullptr && view->getResourceManager() != nullptr) {
                 TestApp::get()->hideView(view);
             }
         }
@@ -198,6 +228,73 @@ TEST_F(ViewReentryTest, ViewHiddenFromItsUpdateIsShownAgainAndDrawsAgain) {
     advance(kTick);
 
     EXPECT_EQ(journal, (Journal{"first update", "first redraw", "first draw"}));
+}
+
+TEST_F(ViewReentryTest, HidingFromAPointerPressOfAnEmulatedFlingStillEndsTheGesture) {
+    showIdle(first.get());
+    first->hideIn = "pressed";
+
+    pal::postKey(first.get(), BaseView::kKeyFlingLeft, 1);
+    pump();
+    advance(kSecond);
+
+    EXPECT_EQ(journal,
+              (Journal{"first key", "first pressed", "first hidden", "first gesture", "first released"}));
+}
+
+TEST_F(ViewReentryTest, HidingFromDrawLeavesNoRedrawHandlerBehind) {
+    showIdle(first.get());
+    first->hideIn = "draw";
+    first->getRedrawManager()->scheduleRedraw();
+    advance(kTick);
+    const int redraws = pal::redrawCount();
+
+    kdGFXRequestRedraw(first.get());
+    pump();
+    advance(kSecond);
+
+    EXPECT_EQ(journal, (Journal{"first redraw", "first draw", "first hidden"}));
+    EXPECT_EQ(redraws, pal::redrawCount());
+}
+
+// The application may delete the view too, once hidden, from inside any of
+// its callbacks; what the view would have done afterwards is dropped.
+TEST_F(ViewReentryTest, ViewDeletedInsideItsCallbacksIsNotTouchedAfterwards) {
+    const char* const callbacks[] = {"update", "size", "redraw", "draw", "pressed", "key", "event104"};
+    for (const char* callback : callbacks) {
+        SCOPED_TRACE(callback);
+        first.reset(new HidingView(&journal, "first"));
+        showIdle(first.get());
+        first->owner = &first;
+        first->hideIn = callback;
+        if (std::string(callback) == "size") {
+            pal::setContextSize(320 + static_cast<int>(journal.size()), 240);
+        }
+        HidingView* view = first.get();
+        first->getRedrawManager()->scheduleUpdate();
+        first->getRedrawManager()->scheduleRedraw();
+        pal::postKey(view, BaseView::kKeyFlingRight, 1);
+        pal::postViewEvent(view, KD_EVENT_VIEW_ACTIVITY_ZVR);
+        pump();
+        advance(kSecond);
+
+        EXPECT_EQ(first.get(), nullptr);
+        EXPECT_EQ(journal.back(), "first deleted");
+        EXPECT_EQ(pal::activeTimerCount(), 0);
+    }
+}
+
+TEST_F(ViewReentryTest, ViewDeletedFromOnSizeChangedWhileItResumesIsNotTouchedAfterwards) {
+    TestApp::get()->showView(first.get());
+    first->owner = &first;
+    first->hideIn = "size";
+
+    pal::postViewResumed();
+    pump();
+    advance(kSecond);
+
+    EXPECT_EQ(journal, (Journal{"first size", "first hidden", "first deleted"}));
+    EXPECT_EQ(pal::activeTimerCount(), 0);
 }
 
 }  // namespace

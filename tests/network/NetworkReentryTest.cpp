@@ -107,4 +107,89 @@ TEST_F(NetworkReentryTest, RetryWaitingForTheNetworkWhilePausedRunsOnResumeWhenT
     EXPECT_EQ(2, task->attempts);
 }
 
+TEST_F(NetworkReentryTest, TaskCancelledFromItsResponseOrItsRetryHearsNothingMore) {
+    Task answered = makeTask(serve("/answered", 200, "body"));
+    answered->onResponse = [&] { manager->cancel(answered); };
+    Task retried = makeTask(serve("/busy", 503));
+    retried->onRetry = [&] { manager->cancel(retried); };
+    manager->submit(answered);
+    manager->submit(retried, policy(1000, 5));
+
+    EXPECT_TRUE(settle([&] { return manager->getTaskCount() == 0; }));
+    advanceMs(10000);
+    pump();
+
+    EXPECT_EQ((std::vector<std::string>{"request", "response 200"}), answered->log);
+    EXPECT_EQ((std::vector<std::string>{"request", "response 503", "retried"}), retried->log);
+    EXPECT_EQ(NetworkManager::NetworkIdle, manager->getNetworkActivityStatus());
+}
+
+// Status listeners are told from a snapshot: one may remove itself or
+// another, and one removed before its turn is not told.
+class OfflineListener {
+public:
+    explicit OfflineListener(std::vector<std::string>* log, const std::string& name) : log(log), name(name) {}
+    NetworkManager::OfflineModeStatusCallback callback() {
+        return NetworkManager::OfflineModeStatusCallback::make<OfflineListener, &OfflineListener::onOffline>(
+            this);
+    }
+    std::function<void()> whenTold;
+
+private:
+    void onOffline(NetworkManager::OfflineModeStatus status) {
+        log->push_back(name + " " + std::to_string(status));
+        if (whenTold) {
+            whenTold();
+        }
+    }
+    std::vector<std::string>* log;
+    std::string name;
+};
+
+TEST_F(NetworkReentryTest, OfflineListenerMayRemoveItselfAndAnotherWhileBeingTold) {
+    std::vector<std::string> log;
+    OfflineListener first(&log, "first");
+    OfflineListener second(&log, "second");
+    first.whenTold = [&] {
+        manager->removeOfflineModeStatusCallback(first.callback());
+        manager->removeOfflineModeStatusCallback(second.callback());
+    };
+    manager->addOfflineModeStatusCallback(first.callback());
+    manager->addOfflineModeStatusCallback(second.callback());
+
+    manager->changeOfflineModeStatus(NetworkManager::OfflineModeOn);
+    manager->changeOfflineModeStatus(NetworkManager::OfflineModeOff);
+    pump();
+
+    EXPECT_EQ((std::vector<std::string>{"first 1"}), log);
+}
+
+// A listener that switches offline mode on again while told that it ended
+// keeps the queued tasks held; they go when it ends for good.
+TEST_F(NetworkReentryTest, OfflineListenerSwitchingOfflineModeOnAgainKeepsTheQueueHeld) {
+    std::vector<std::string> log;
+    OfflineListener listener(&log, "listener");
+    bool switchBack = true;
+    listener.whenTold = [&] {
+        if (switchBack && manager->getOfflineModeStatus() == NetworkManager::OfflineModeOff) {
+            switchBack = false;
+            manager->changeOfflineModeStatus(NetworkManager::OfflineModeOn);
+        }
+    };
+    manager->addOfflineModeStatusCallback(listener.callback());
+    manager->changeOfflineModeStatus(NetworkManager::OfflineModeOn);
+    Task task = makeTask(serve("/queued", 200, "ok"));
+    manager->submit(task);
+
+    manager->changeOfflineModeStatus(NetworkManager::OfflineModeOff);
+    pump();
+    EXPECT_EQ(1, manager->getUnreadyCount());
+    EXPECT_EQ(0, task->attempts);
+
+    manager->changeOfflineModeStatus(NetworkManager::OfflineModeOff);
+    EXPECT_TRUE(settle([&] { return task->finished(); }));
+    EXPECT_EQ((std::vector<int>{200}), task->finishCodes);
+    manager->removeOfflineModeStatusCallback(listener.callback());
+}
+
 }  // namespace
