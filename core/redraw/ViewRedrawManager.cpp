@@ -59,7 +59,8 @@ ViewRedrawManager::ViewRedrawManager(ViewRedrawManagerDelegate& delegate)
       updateScheduled(false),
       redrawScheduled(false),
       isViewPaused(true),
-      destroyedDuringTick(nullptr) {
+      destroyedDuringTick(nullptr),
+      lifetime(boost::make_shared<bool>(true)) {
     Lifecycle::PauseResumeHandler* handler = Lifecycle::PauseResumeHandler::getInstance();
     KD_ASSERT(handler != nullptr);
     if (handler != nullptr) {

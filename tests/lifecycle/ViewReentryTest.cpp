@@ -11,6 +11,7 @@
 
 #include "BaseView.h"
 #include "TestApp.h"
+#include "redraw/UpdateGenerator.h"
 #include "redraw/ViewRedrawManager.h"
 
 namespace {
@@ -78,6 +79,13 @@ public:
         BaseView::onKey(key, x, y);
     }
     void onGesture(const KDEventData*) override { note("gesture"); }
+    void shutdown() override {
+        BaseView::shutdown();
+        if (hideIn == "shutdown") {
+            note("shutdown");
+            TestApp::get()->hideView(this);
+        }
+    }
 
     std::string hideIn;
     HidingView* next = nullptr;
@@ -295,6 +303,37 @@ TEST_F(ViewReentryTest, ViewDeletedFromOnSizeChangedWhileItResumesIsNotTouchedAf
 
     EXPECT_EQ(journal, (Journal{"first size", "first hidden", "first deleted"}));
     EXPECT_EQ(pal::activeTimerCount(), 0);
+}
+
+// A screen switch at the end of an animation: the view is hidden from its
+// update while the animation's generator still exists, and the generator
+// goes afterwards.
+TEST_F(ViewReentryTest, GeneratorOfAnAnimationMayOutliveTheViewHiddenFromItsUpdate) {
+    showIdle(first.get());
+    boost::scoped_ptr<Redraw::UpdateGenerator> animation(
+        new Redraw::UpdateGenerator(*first->getRedrawManager()));
+    first->next = second.get();
+    first->hideIn = "update";
+
+    advance(kTick);
+    animation.reset();
+    advance(kSecond);
+
+    EXPECT_EQ(journal.front(), "first update");
+    EXPECT_EQ(journal[1], "first hidden");
+    EXPECT_EQ(TestApp::get()->getCurrentView(), second.get());
+    EXPECT_EQ(pal::activeTimerCount(), 0);
+}
+
+TEST_F(ViewReentryTest, HidingAViewAgainFromItsOwnShutdownIsAnAssertionAndShutsItDownOnce) {
+    showIdle(first.get());
+    first->hideIn = "shutdown";
+
+    TestApp::get()->hideView(first.get());
+
+    expectAssertion("!beingHidden && \"a view is not hidden again from inside its own shutdown()\"");
+    EXPECT_EQ(journal, (Journal{"first shutdown"}));
+    EXPECT_EQ(first->getResourceManager(), nullptr);
 }
 
 }  // namespace
