@@ -18,13 +18,16 @@ export UBSAN_OPTIONS ?= halt_on_error=1:print_stacktrace=1
 export TSAN_OPTIONS ?= halt_on_error=1:second_deadlock_stack=1:suppressions=$(SANITIZER_FILES)/tsan.supp
 # make fuzz: the libFuzzer targets (clang, ASan+UBSan) in their own folder, each run in turn for
 # FUZZ_SECONDS. New inputs go to FUZZ_DIR/work/<Name>, findings to FUZZ_DIR/findings/, so the
-# checked-in seed corpus only grows by hand.
+# checked-in seed corpus only grows by hand. A target parsing markup takes its words from
+# fuzz/dict/<Name>.dict.
 FUZZ_DIR ?= build-fuzz
 FUZZ_SECONDS ?= 60
 # make cross-test ARCH=arm64|armhf: cross-build in build-cross-ARCH and run the tests under qemu.
 ARCH ?= arm64
+# make tsan-test: the areas whose code crosses threads, under ThreadSanitizer in build-tsan.
+TSAN_AREAS ?= pal tasking http network
 
-.PHONY: deps configure build test demo bench fuzz-build fuzz fuzz-replay cross-test clean
+.PHONY: deps configure build test tsan-test demo bench fuzz-build fuzz fuzz-replay cross-test clean
 
 deps:
 	@bash scripts/install-deps.sh
@@ -38,6 +41,10 @@ build: configure
 test: build
 	@ctest --test-dir $(BUILD_DIR) --output-on-failure -j $(JOBS) \
 	  $(if $(AREAS),-L '^($(subst $(space),|,$(strip $(AREAS))))$$')
+
+tsan-test:
+	@$(MAKE) --no-print-directory test BUILD_DIR=build-tsan AREAS="$(TSAN_AREAS)" \
+	  CMAKE_ARGS="-DMAPCORE_SANITIZE=thread -DMAPCORE_BENCHMARKS=OFF"
 
 demo: build
 	@$(BUILD_DIR)/examples/demo/mapcore_demo
@@ -54,7 +61,8 @@ fuzz: fuzz-build
 	for f in $(FUZZ_DIR)/fuzz/fuzz_*; do \
 	  name=$${f##*/fuzz_}; echo "== fuzz_$$name for $(FUZZ_SECONDS) s"; \
 	  mkdir -p $(FUZZ_DIR)/work/$$name; \
-	  $$f -max_total_time=$(FUZZ_SECONDS) -print_final_stats=1 \
+	  dict=; [ -f fuzz/dict/$$name.dict ] && dict=-dict=fuzz/dict/$$name.dict; \
+	  $$f -max_total_time=$(FUZZ_SECONDS) -print_final_stats=1 $$dict \
 	    -artifact_prefix=$(FUZZ_DIR)/findings/$$name- \
 	    $(FUZZ_DIR)/work/$$name fuzz/corpus/$$name || status=1; \
 	done; exit $$status

@@ -5,6 +5,7 @@
 #include <KD/kd.h>
 #include <benchmark/benchmark.h>
 #include <curl/curl.h>
+#include <httplib.h>
 
 #include <boost/make_shared.hpp>
 #include <chrono>
@@ -15,8 +16,6 @@
 #include "network/HttpConnection.h"
 #include "network/HttpEngine.h"
 #include "network/HttpRequest.h"
-
-#include <httplib.h>
 
 namespace {
 

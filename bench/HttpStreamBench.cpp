@@ -12,11 +12,11 @@
 #include <boost/make_shared.hpp>
 #include <chrono>
 #include <cstdint>
-#include <fstream>
 #include <string>
 #include <thread>
 #include <vector>
 
+#include "PeakMemory.h"
 #include "network/HttpConnection.h"
 #include "network/HttpEngine.h"
 #include "network/HttpRequest.h"
@@ -77,46 +77,6 @@ std::uint64_t work(const unsigned char* data, std::size_t size) {
     return sum;
 }
 
-// Peak resident memory since the last reset, in kB (Linux).
-long peakKb() {
-    std::ifstream status("/proc/self/status");
-    std::string line;
-    while (std::getline(status, line)) {
-        if (line.compare(0, 6, "VmHWM:") == 0) {
-            return std::stol(line.substr(6));
-        }
-    }
-    return 0;
-}
-
-long residentKb() {
-    std::ifstream status("/proc/self/status");
-    std::string line;
-    while (std::getline(status, line)) {
-        if (line.compare(0, 6, "VmRSS:") == 0) {
-            return std::stol(line.substr(6));
-        }
-    }
-    return 0;
-}
-
-// Makes the peak start from the current resident size again.
-void resetPeak() {
-    std::ofstream("/proc/self/clear_refs") << "5";
-}
-
-class MemoryProbe {
-public:
-    MemoryProbe() {
-        resetPeak();
-        start = residentKb();
-    }
-    double growthMb() const { return static_cast<double>(peakKb() - start) / 1024.0; }
-
-private:
-    long start;
-};
-
 size_t slowWrite(char* data, size_t size, size_t count, void* sum) {
     *static_cast<std::uint64_t*>(sum) += work(reinterpret_cast<unsigned char*>(data), size * count);
     return size * count;
@@ -127,7 +87,7 @@ void BM_PlainCurlSlowCaller(benchmark::State& state) {
     double worstGrowth = 0;
     std::uint64_t sum = 0;
     for (auto _ : state) {
-        MemoryProbe probe;
+        PeakMemoryProbe probe;
         CURL* handle = curl_easy_init();
         curl_easy_setopt(handle, CURLOPT_URL, url.c_str());
         curl_easy_setopt(handle, CURLOPT_NOSIGNAL, 1L);
@@ -190,7 +150,7 @@ void BM_HttpConnectionSlowCaller(benchmark::State& state) {
     SlowCaller caller(streamServer().url);
     double worstGrowth = 0;
     for (auto _ : state) {
-        MemoryProbe probe;
+        PeakMemoryProbe probe;
         bool ok = caller.run();
         worstGrowth = std::max(worstGrowth, probe.growthMb());
         if (!ok) {

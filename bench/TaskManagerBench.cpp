@@ -18,9 +18,8 @@
 #include <thread>
 #include <vector>
 
-#include "tasking/TaskManager.h"
-
 #include "RateReporter.h"
+#include "tasking/TaskManager.h"
 
 namespace {
 
@@ -124,7 +123,6 @@ void BM_BareWorkerThreadYielding(benchmark::State& state) {
     runBareWorker(state, true);
 }
 BENCHMARK(BM_BareWorkerThreadYielding)->UseRealTime()->Unit(benchmark::kMillisecond);
-
 
 }  // namespace
 

@@ -14,9 +14,8 @@
 #include <string>
 #include <thread>
 
-#include "util/ThreadCallback.h"
-
 #include "RateReporter.h"
+#include "util/ThreadCallback.h"
 
 namespace {
 
@@ -116,7 +115,6 @@ void BM_BareConditionVariableQueue(benchmark::State& state) {
     state.SetItemsProcessed(state.iterations() * kCallsPerIteration);
 }
 BENCHMARK(BM_BareConditionVariableQueue)->UseRealTime()->Unit(benchmark::kMillisecond);
-
 
 }  // namespace
 

@@ -3,12 +3,14 @@
 #include <KD/kd.h>
 
 #include <cstring>
+#include <new>
 
 #include "image/JPGImage.h"
 #include "image/PNGImage.h"
 #include "io/FileManager.h"
 #include "io/InputStream.h"
 #include "math/Color.h"
+#include "util/Logger.h"
 
 namespace {
 
@@ -28,22 +30,23 @@ boost::shared_ptr<Image> Image::createImage(IO::InputStream* in, ImageFormat for
     if (in == nullptr) {
         return boost::shared_ptr<Image>();
     }
-    boost::shared_ptr<Image> image;
-    switch (format) {
-        case PNG:
-            image.reset(new PNGImage());
-            break;
-        case JPEG:
-            image.reset(new JPGImage());
-            break;
-        default:
-            KD_ASSERT(false);
-            return image;
+    if (format != PNG && format != JPEG) {
+        KD_ASSERT(false);
+        return boost::shared_ptr<Image>();
     }
-    if (!image->init(in)) {
-        image.reset();
+    // The pixels get no memory through a throwing allocation; whatever else runs short while
+    // decoding (the decoders release their state on the way out) is a failed decode too.
+    try {
+        boost::shared_ptr<Image> image(format == PNG ? static_cast<Image*>(new PNGImage())
+                                                     : static_cast<Image*>(new JPGImage()));
+        if (!image->init(in)) {
+            image.reset();
+        }
+        return image;
+    } catch (const std::bad_alloc&) {
+        Logger::log(Logger::Error, "Image: out of memory while decoding");
+        return boost::shared_ptr<Image>();
     }
-    return image;
 }
 
 boost::shared_ptr<Image> Image::createImageFromFile(const char* path, ImageFormat format) {
@@ -77,7 +80,11 @@ boost::shared_ptr<Image> Image::clone() const {
     copy->paletteBitsPerEntry = paletteBitsPerEntry;
     copy->paletteSize = paletteSize;
     if (getSize() != 0 && data) {
-        copy->data.reset(new unsigned char[getSize()]);
+        copy->data.reset(new (std::nothrow) unsigned char[getSize()]);
+        if (!copy->data) {
+            Logger::log(Logger::Error, "Image: no memory for a copy of %u bytes", getSize());
+            return boost::shared_ptr<Image>();
+        }
         std::memcpy(copy->data.get(), data.get(), getSize());
     }
     return copy;
@@ -123,9 +130,16 @@ bool Image::allocate(unsigned newWidth, unsigned newHeight, unsigned newBitsPerP
     paletteSize = newPaletteSize;
     paletteBitsPerEntry = newPaletteBitsPerEntry;
     if (getSize() != 0) {
+        // Sized by the file: running short of memory refuses the image.
+        data.reset(new (std::nothrow) unsigned char[getSize()]);
+        if (!data) {
+            Logger::log(Logger::Error, "Image: no memory for %ux%u pixels of %u bits", newWidth, newHeight,
+                        newBitsPerPixel);
+            reset();
+            return false;
+        }
         // Decoders write every row; only the palette, which files may fill in
         // part, starts zeroed.
-        data.reset(new unsigned char[getSize()]);
         std::memset(data.get(), 0, newPaletteSize * newPaletteBitsPerEntry / 8);
     }
     return true;

@@ -30,7 +30,8 @@ public:
     virtual ~Image();
 
     // Decodes the stream with the decoder of format; empty when in is null,
-    // the format is unknown (an assertion) or decoding fails.
+    // the format is unknown (an assertion) or decoding fails, also for want
+    // of memory.
     static boost::shared_ptr<Image> createImage(IO::InputStream* in, ImageFormat format);
     // Empty when the file cannot be opened or does not decode.
     static boost::shared_ptr<Image> createImageFromFile(const char* path, ImageFormat format);
@@ -41,6 +42,7 @@ public:
     static boost::shared_ptr<Image> createImage(const std::vector<unsigned char>& pixels, unsigned width,
                                                 unsigned height, unsigned bitsPerPixel);
 
+    // Empty when there is no memory for the copy.
     boost::shared_ptr<Image> clone() const;
     // Inverts the brightness of every colour (palette entries when there is a
     // palette, else pixels) and keeps alpha; gray and indexed pixels without
@@ -66,7 +68,7 @@ protected:
 
     // Sets the layout and allocates data for it, with a zeroed palette (no
     // array when the size is 0); false, leaving the image empty, when a side is above
-    // kMaxSide or the bits per pixel are not whole bytes up to 32.
+    // kMaxSide, the bits per pixel are not whole bytes up to 32 or memory runs short.
     bool allocate(unsigned newWidth, unsigned newHeight, unsigned newBitsPerPixel, unsigned newPaletteSize,
                   unsigned newPaletteBitsPerEntry);
     void reset();

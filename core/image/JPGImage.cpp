@@ -2,6 +2,8 @@
 
 #include <KD/kd.h>
 
+#include <algorithm>
+#include <climits>
 #include <csetjmp>
 #include <cstdio>
 #include <cstring>
@@ -89,6 +91,39 @@ void skipInputData(j_decompress_ptr cinfo, long count) {
 
 void termSource(j_decompress_ptr) {}
 
+// Destroys the decompressor however init ends: by a return, a jump back from
+// the library or an exception.
+class DecompressorRelease {
+public:
+    explicit DecompressorRelease(j_decompress_ptr cinfo) : cinfo(cinfo) {}
+    ~DecompressorRelease() { jpeg_destroy_decompress(cinfo); }
+
+private:
+    DecompressorRelease(const DecompressorRelease&) = delete;
+    DecompressorRelease& operator=(const DecompressorRelease&) = delete;
+
+    j_decompress_ptr cinfo;
+};
+
+// What the library may allocate for one image besides the pixels we hold: its
+// row buffers, and for progressive or multi-scan files the coefficients of the
+// whole image, which a header of a hundred bytes can declare by the hundred
+// megabytes. Real files of that kind carry data in proportion.
+long libraryMemoryLimit(IO::InputStream* in) {
+    const long long base = 16LL << 20;
+    const long long perInputByte = 64;
+    const long long inputBytes = std::max(0LL, std::min(in->available(), 1LL << 30));
+    return static_cast<long>(std::min<long long>(base + perInputByte * inputBytes, LONG_MAX));
+}
+
+bool isSupportedColourLayout(j_decompress_ptr cinfo) {
+    if (cinfo->num_components == 1) {
+        return cinfo->jpeg_color_space == JCS_GRAYSCALE;
+    }
+    return cinfo->num_components == 3 &&
+           (cinfo->jpeg_color_space == JCS_YCbCr || cinfo->jpeg_color_space == JCS_RGB);
+}
+
 }  // namespace
 
 bool JPGImage::init(IO::InputStream* in) {
@@ -110,14 +145,21 @@ bool JPGImage::init(IO::InputStream* in) {
     source.in = in;
     source.startOfFile = true;
 
+    const long memoryLimit = libraryMemoryLimit(in);
+    DecompressorRelease release(&cinfo);
     // Set only on the path without a jump back.
     volatile bool decoded = false;
     if (setjmp(errors.jump) == 0) {
         jpeg_create_decompress(&cinfo);
         cinfo.src = &source.base;
+        // Beyond it the library refuses to buffer the image (it has no backing store) instead of
+        // allocating.
+        cinfo.mem->max_memory_to_use = memoryLimit;
         decoded = decode(&cinfo);
     }
-    jpeg_destroy_decompress(&cinfo);
+    if (errors.base.msg_code == JERR_NO_BACKING_STORE) {
+        Logger::log(Logger::Error, "JPEG: buffering the image would take more than %ld bytes", memoryLimit);
+    }
     if (!decoded) {
         reset();
     }
@@ -143,21 +185,22 @@ bool JPGImage::decode(j_decompress_ptr cinfo) {
 }
 
 bool JPGImage::prepareLayout(j_decompress_ptr cinfo) {
+    // Every refusal comes before jpeg_start_decompress, which allocates the library's buffers for
+    // each component, so that refusing a file costs nothing.
     if (cinfo->jpeg_color_space == JCS_CMYK || cinfo->jpeg_color_space == JCS_YCCK) {
         Logger::log(Logger::Error, "JPEG: CMYK images are not supported");
         return false;
     }
-    // Checked before the library allocates anything for the image.
+    if (!isSupportedColourLayout(cinfo)) {
+        Logger::log(Logger::Error, "JPEG: %d components in colour space %d are not supported",
+                    cinfo->num_components, static_cast<int>(cinfo->jpeg_color_space));
+        return false;
+    }
     if (cinfo->image_width > kMaxSide || cinfo->image_height > kMaxSide) {
         Logger::log(Logger::Error, "JPEG: %ux%u is larger than %ux%u", cinfo->image_width,
                     cinfo->image_height, kMaxSide, kMaxSide);
         return false;
     }
     jpeg_start_decompress(cinfo);
-    const unsigned components = cinfo->output_components;
-    if ((components != 1 && components != 3) ||
-        !allocate(cinfo->output_width, cinfo->output_height, components * 8, 0, 0)) {
-        return false;
-    }
-    return true;
+    return allocate(cinfo->output_width, cinfo->output_height, cinfo->output_components * 8, 0, 0);
 }

@@ -35,6 +35,21 @@ void readFromStream(png_structp png, png_bytep buffer, png_size_t length) {
     in->read(buffer, static_cast<int>(length));
 }
 
+// Destroys libpng's structures however decoding ends, an exception included.
+class ReadStructRelease {
+public:
+    explicit ReadStructRelease(png_structp png) : png(png), info(nullptr) {}
+    ~ReadStructRelease() { png_destroy_read_struct(&png, info ? &info : nullptr, nullptr); }
+    void setInfo(png_infop newInfo) { info = newInfo; }
+
+private:
+    ReadStructRelease(const ReadStructRelease&) = delete;
+    ReadStructRelease& operator=(const ReadStructRelease&) = delete;
+
+    png_structp png;
+    png_infop info;
+};
+
 }  // namespace
 
 bool PNGImage::init(IO::InputStream* in) {
@@ -43,13 +58,13 @@ bool PNGImage::init(IO::InputStream* in) {
     if (png == nullptr) {
         return false;
     }
+    ReadStructRelease release(png);
     png_infop info = png_create_info_struct(png);
     if (info == nullptr) {
-        png_destroy_read_struct(&png, nullptr, nullptr);
         return false;
     }
-    bool decoded = decode(png, info, in);
-    png_destroy_read_struct(&png, &info, nullptr);
+    release.setInfo(info);
+    const bool decoded = decode(png, info, in);
     if (!decoded) {
         reset();
     }

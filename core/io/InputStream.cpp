@@ -3,6 +3,7 @@
 #include <cstring>
 #include <vector>
 
+#include "io/BoundedReader.h"
 #include "io/Exception.h"
 #include "util/Logger.h"
 
@@ -90,11 +91,13 @@ bool InputStream::readString(std::string& out) {
         handleBadState();
         return false;
     }
-    std::vector<char> bytes(length);
-    if (read(bytes.data(), length) < length) {
+    // available() is only what the stream claims (a zip entry's header, say): the buffer grows
+    // with the bytes that actually arrive.
+    std::vector<char> bytes;
+    if (!BoundedReader::readExactly(*this, static_cast<std::size_t>(length), bytes)) {
         return false;
     }
-    out.assign(bytes.data(), length);
+    out.assign(bytes.data(), bytes.size());
     return true;
 }
 

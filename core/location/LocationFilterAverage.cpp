@@ -7,6 +7,7 @@
 #include "location/LocationFilterGenerateCourse.h"
 #include "location/LocationFilterGenerateSpeed.h"
 #include "location/LocationFilterMinDistance.h"
+#include "location/impl/Motion.h"
 #include "math/CoordConversion.h"
 
 namespace Location {
@@ -17,7 +18,7 @@ const float kResetDistanceMetres = 83.0f;
 
 }  // namespace
 
-LocationFilterAverage::LocationFilterAverage() : lastX(0), lastY(0) {
+LocationFilterAverage::LocationFilterAverage() : hasLast(false) {
     addFilter(boost::make_shared<LocationFilterMinDistance>());
     addFilter(boost::make_shared<LocationFilterAveragePosition>());
     addFilter(boost::make_shared<LocationFilterGenerateSpeed>());
@@ -27,15 +28,26 @@ LocationFilterAverage::LocationFilterAverage() : lastX(0), lastY(0) {
 
 Location LocationFilterAverage::filter(const Location& location) {
     if (location.accuracy >= 0.0f && location.precision == PrecisionSatellite) {
-        const bool hasLast = lastX != 0 && lastY != 0;
-        if (hasLast &&
-            CoordConversion::getDistance(lastX, lastY, location.x, location.y) >= kResetDistanceMetres) {
-            reset();
+        if (startsAfresh(location)) {
+            LocationFilterComplex::reset();
         }
-        lastX = location.x;
-        lastY = location.y;
+        hasLast = true;
+        last = location;
     }
     return LocationFilterComplex::filter(location);
+}
+
+bool LocationFilterAverage::startsAfresh(const Location& location) const {
+    if (!hasLast) {
+        return false;
+    }
+    return CoordConversion::getDistance(last.x, last.y, location.x, location.y) >= kResetDistanceMetres ||
+           Motion::secondsBetween(last, location) > kMaxGapSeconds;
+}
+
+void LocationFilterAverage::reset() {
+    LocationFilterComplex::reset();
+    hasLast = false;
 }
 
 }  // namespace Location

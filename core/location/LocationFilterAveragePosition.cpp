@@ -36,6 +36,13 @@ float wrapLongitude(float longitude) {
     return longitudeDifference(0.0f, longitude);
 }
 
+void addAltitude(const Location& fix, float& sum, size_t& count) {
+    if (fix.altitude != -1.0f) {
+        sum += fix.altitude;
+        ++count;
+    }
+}
+
 }  // namespace
 
 // A plain mean of the last fixes trails a moving receiver by a fix or more (14
@@ -46,10 +53,15 @@ float wrapLongitude(float longitude) {
 // without saying where, or across a long gap, ends the carrying: it and older
 // fixes are left out.
 //
+// A fix whose reported speed its displacement belies is carried as the
+// displacement says: one glitch of 100 m/s would otherwise throw the mean tens
+// of metres ahead for as long as the fix stays in the window.
+//
 // Sums run over offsets from the newest fix, which single precision keeps
-// exactly, rather than over whole latitudes.
+// exactly, rather than over whole latitudes. A missing altitude (-1) is left
+// out of the altitude's mean rather than averaged as a height.
 Location LocationFilterAveragePosition::filter(const Location& location) {
-    window.push_back(location);
+    window.push_back(window.empty() ? location : Motion::withBelievableMotion(window.back(), location));
     while (window.size() > kWindowSize) {
         window.pop_front();
     }
@@ -58,7 +70,9 @@ Location LocationFilterAveragePosition::filter(const Location& location) {
     Motion::degreesPerMetre(newest.latitude, latitudePerMetre, longitudePerMetre);
     float latitudeOffset = 0.0f;
     float longitudeOffset = 0.0f;
-    float altitudeSum = newest.altitude;
+    float altitudeSum = 0.0f;
+    size_t altitudeCount = 0;
+    addAltitude(newest, altitudeSum, altitudeCount);
     size_t count = 1;
     float carriedEast = 0.0f;
     float carriedNorth = 0.0f;
@@ -80,16 +94,16 @@ Location LocationFilterAveragePosition::filter(const Location& location) {
         latitudeOffset += older.latitude - newest.latitude + carriedNorth * latitudePerMetre;
         longitudeOffset +=
             longitudeDifference(newest.longitude, older.longitude) + carriedEast * longitudePerMetre;
-        altitudeSum += older.altitude;
+        addAltitude(older, altitudeSum, altitudeCount);
         ++count;
         laterEast = east;
         laterNorth = north;
     }
     const float n = static_cast<float>(count);
     Location averaged = location;
-    averaged.latitude = newest.latitude + latitudeOffset / n;
+    averaged.latitude = Motion::clampLatitude(newest.latitude + latitudeOffset / n);
     averaged.longitude = wrapLongitude(newest.longitude + longitudeOffset / n);
-    averaged.altitude = altitudeSum / n;
+    averaged.altitude = altitudeCount > 0 ? altitudeSum / static_cast<float>(altitudeCount) : -1.0f;
     CoordConversion::toXY(averaged.latitude, averaged.longitude, averaged.x, averaged.y);
     return averaged;
 }

@@ -84,21 +84,25 @@ Location LocationFilterKalman::filter(const Location& location) {
     if (!isValid(location)) {
         return LocationFilterComplex::droppedFix();
     }
+    // A speed glitch would push the prediction far ahead; the fix's
+    // displacement tells how it really moved.
+    const Location fix =
+        isValid(lastAccepted) ? Motion::withBelievableMotion(lastAccepted, location) : location;
     if (!isValid(lastAccepted)) {
-        originX = location.x;
-        originY = location.y;
-        start(location);
+        originX = fix.x;
+        originY = fix.y;
+        start(fix);
     } else {
-        update(location, measurementOf(location));
+        update(fix, measurementOf(fix));
     }
     // A degenerate fix (zero accuracy standing still) can make the gain
     // singular; start again from this fix rather than hand out NaN.
     if (!isFinite(estimate)) {
-        originX = location.x;
-        originY = location.y;
-        start(location);
+        originX = fix.x;
+        originY = fix.y;
+        start(fix);
     }
-    lastAccepted = location;
+    lastAccepted = fix;
     return adjustLocation(location);
 }
 
@@ -192,7 +196,7 @@ Location LocationFilterKalman::adjustLocation(const Location& fix) const {
     metresPerUnit /= 1.0e6f;
     float latitudePerMetre, longitudePerMetre;
     Motion::degreesPerMetre(fix.latitude, latitudePerMetre, longitudePerMetre);
-    adjusted.latitude = fix.latitude - offset.y * metresPerUnit * latitudePerMetre;
+    adjusted.latitude = Motion::clampLatitude(fix.latitude - offset.y * metresPerUnit * latitudePerMetre);
     adjusted.longitude = fix.longitude + offset.x * metresPerUnit * longitudePerMetre;
     adjusted.altitude = estimate.z;
     return adjusted;

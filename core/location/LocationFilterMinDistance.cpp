@@ -5,10 +5,12 @@
 
 namespace Location {
 
-LocationFilterMinDistance::LocationFilterMinDistance() : lastLatitude(0.0f), lastLongitude(0.0f) {}
+LocationFilterMinDistance::LocationFilterMinDistance()
+    : hasLast(false), lastLatitude(0.0f), lastLongitude(0.0f) {}
 
 Location LocationFilterMinDistance::filter(const Location& location) {
-    if (lastLatitude == 0.0f || lastLongitude == 0.0f) {
+    if (!hasLast) {
+        hasLast = true;
         lastLatitude = location.latitude;
         lastLongitude = location.longitude;
         return location;
@@ -30,6 +32,7 @@ Location LocationFilterMinDistance::filter(const Location& location) {
 }
 
 void LocationFilterMinDistance::reset() {
+    hasLast = false;
     lastLatitude = 0.0f;
     lastLongitude = 0.0f;
 }

@@ -15,6 +15,9 @@ public:
     void reset() override;
 
 private:
+    // Its own flag: latitude or longitude 0 is a place like any other (the
+    // equator, the prime meridian).
+    bool hasLast;
     float lastLatitude;
     float lastLongitude;
 };

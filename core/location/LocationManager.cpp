@@ -110,18 +110,32 @@ void LocationManager::onProviderStatusChanged(LocationProvider* provider, Provid
         isPaused) {
         return;
     }
-    locationProviderWireless->enable();
+    // Already running, it is left alone: enabling again would drop the query
+    // on its way and start another.
+    if (locationProviderWireless->getStatus() == StatusDisabled) {
+        locationProviderWireless->enable();
+    }
     setPrecision(locationProviderWireless->getPrecision());
 }
 
-// A network precision does not override a satellite provider that has a fix.
+// A network precision does not override a satellite provider that has a fix,
+// and a precision of none (an answer without a usable accuracy) says nothing
+// about how well the position is known: the overall precision stays.
 void LocationManager::onProviderPrecisionChanged(LocationProvider* provider, LocationPrecision,
                                                  LocationPrecision newPrecision) {
-    if (!checkProvider(provider) ||
+    if (!checkProvider(provider) || newPrecision == PrecisionNone ||
         (provider == locationProviderWireless.get() && locationProviderGPS->getStatus() == StatusAvailable)) {
         return;
     }
     setPrecision(newPrecision);
+}
+
+void LocationManager::setSmoother(LocationSmoother::Kind kind) {
+    locationProviderGPS->setSmoother(kind);
+}
+
+LocationSmoother::Kind LocationManager::getSmoother() const {
+    return locationProviderGPS->getSmoother();
 }
 
 void LocationManager::setPrecision(LocationPrecision newPrecision) {

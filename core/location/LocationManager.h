@@ -8,6 +8,7 @@
 #include "lifecycle/PauseResumeListenerWrapper.h"
 #include "location/LocationListener.h"
 #include "location/LocationProvider.h"
+#include "location/LocationSmoother.h"
 #include "util/Singleton.h"
 
 namespace Simulator {
@@ -34,6 +35,22 @@ public:
 
     // Not owned; null for none. See Simulator::AbstractSimulator.
     void setSimulator(Simulator::AbstractSimulator* simulator);
+
+    // How satellite fixes are smoothed; takes effect from the next fix and
+    // glides there without a jump (see LocationSmoother). RMS position error
+    // as a share of the raw fixes' on synthetic tracks (LocationFilterQualityBench):
+    //
+    //   track                         raw     Chain (default)   Kalman
+    //   standing, 20 m accuracy       7.1 m        76 %           22 %
+    //   walking                       5.7 m        57 %           31 %
+    //   driving with turns            4.1 m        64 %           53 %
+    //   walking with 150 m outliers  13.3 m        94 %           26 %
+    //
+    // The chain holds a standing position still and keeps the behaviour
+    // applications know; the Kalman filter is closer to the truth on every
+    // track but lets the marker drift by a metre or two while standing.
+    void setSmoother(LocationSmoother::Kind kind);
+    LocationSmoother::Kind getSmoother() const;
 
     // The last accepted record; RawLocation::unknown (world values -1,
     // x and y 0) before the first.

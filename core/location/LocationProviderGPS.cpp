@@ -1,13 +1,16 @@
 #include "location/LocationProviderGPS.h"
 
 #include "location/AbstractSimulator.h"
+#include "util/Logger.h"
 
 namespace Location {
 
 LocationProviderGPS* LocationProviderGPS::theLocationProviderGPS = nullptr;
 
 LocationProviderGPS::LocationProviderGPS(LocationManager* manager)
-    : LocationProvider("GPS", manager), filter(new LocationFilterAverage()), simulator(nullptr) {
+    : LocationProvider("GPS", manager),
+      simulator(nullptr),
+      fixTimeout(callback<void (*)()>::make<LocationProviderGPS, &LocationProviderGPS::onFixTimeout>(this)) {
     KD_ASSERT(theLocationProviderGPS == __null);
     theLocationProviderGPS = this;
     kdInstallCallback(&LocationProviderGPS::onLocationEventWrapper, KD_EVENT_LOCATION_ZVR, nullptr);
@@ -28,13 +31,25 @@ LocationProviderGPS::~LocationProviderGPS() {
 }
 
 void LocationProviderGPS::enable() {
-    setStatus(StatusAvailable);
+    fixAvailable();
     kdLocationStartZVR();
 }
 
 void LocationProviderGPS::disable() {
+    fixTimeout.cancel();
     kdLocationStopZVR();
     setStatus(StatusDisabled);
+}
+
+void LocationProviderGPS::fixAvailable() {
+    fixTimeout.start(Util::Timer::OneShot, kFixLostAfterMs * 1000000ll);
+    setStatus(StatusAvailable);
+}
+
+void LocationProviderGPS::onFixTimeout() {
+    if (getStatus() == StatusAvailable) {
+        setStatus(StatusEnabled);
+    }
 }
 
 void LocationProviderGPS::onLocationEventWrapper(const KDEvent* e) {
@@ -59,14 +74,16 @@ void LocationProviderGPS::onStatusEvent(const KDEvent* e) {
     switch (e->data.words[0]) {
         case 0:
         case 1:
+            fixTimeout.cancel();
             setStatus(StatusEnabled);
             break;
         case 2:
-            setStatus(StatusAvailable);
+            fixAvailable();
             break;
         default:
-            KD_ASSERT(false);
-            setStatus(StatusEnabled);
+            // The platform's to give, not ours to be wrong about.
+            Logger::log(Logger::Warning, "LocationProviderGPS: unknown satellite status %d ignored",
+                        static_cast<int>(e->data.words[0]));
             break;
     }
 }
@@ -99,17 +116,20 @@ void LocationProviderGPS::onLocationEvent(const KDEvent* e) {
     if (!admit(raw, simulated)) {
         return;
     }
+    fixAvailable();
     Location location(raw);
     location.initFromRaw();
-    Location result = filter->filter(location);
-    if (result.accuracy < 0.0f || result.precision == PrecisionNone) {
+    Location result = smoother.filter(location);
+    if (result.accuracy < 0.0f || result.precision == PrecisionNone || !result.hasUsablePosition()) {
         return;
     }
     if (simulated) {
         result.fixTime = -1;
     }
-    if (result.precision != getPrecision()) {
-        changePrecision(result.precision);
+    // The receiver's precision, not the record's: the chain marks a fix it
+    // has no course for yet as network level, yet the receiver has its fix.
+    if (raw.precision != getPrecision()) {
+        changePrecision(raw.precision);
     }
     reportNewLocation(result);
 }

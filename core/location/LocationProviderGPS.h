@@ -2,10 +2,9 @@
 
 #include <KD/kdext.h>
 
-#include <boost/scoped_ptr.hpp>
-
-#include "location/LocationFilterAverage.h"
 #include "location/LocationProvider.h"
+#include "location/LocationSmoother.h"
+#include "util/Timer.h"
 
 namespace Simulator {
 class AbstractSimulator;
@@ -14,10 +13,20 @@ class AbstractSimulator;
 namespace Location {
 
 // Satellite fixes from the platform (events 101 and 102), smoothed by the
-// filter chain. At most one exists, owned by the location manager; main
-// thread only.
+// filter chain or the Kalman filter. At most one exists, owned by the location
+// manager; main thread only.
+//
+// Status 2 means the receiver has a fix: a fix sets it, whatever the status
+// events said before, and kFixLostAfterMs without a fix drops it to 1, so the
+// manager hands over to network positioning also when the platform never says
+// that the fix was lost.
 class LocationProviderGPS : public LocationProvider {
 public:
+    // A few fix intervals of a receiver that reports once a second: long
+    // enough not to hand over on one late fix, short enough that a driver
+    // entering a tunnel is not left on a stale position.
+    static constexpr long long kFixLostAfterMs = 5000;
+
     explicit LocationProviderGPS(LocationManager* manager);
     ~LocationProviderGPS() override;
 
@@ -26,6 +35,8 @@ public:
 
     // Not owned; null for none.
     void setSimulator(Simulator::AbstractSimulator* newSimulator) { simulator = newSimulator; }
+    void setSmoother(LocationSmoother::Kind kind) { smoother.select(kind); }
+    LocationSmoother::Kind getSmoother() const { return smoother.getSelected(); }
 
     static void onLocationEventWrapper(const KDEvent* e);
     static void onStatusEventWrapper(const KDEvent* e);
@@ -35,9 +46,13 @@ private:
     void onStatusEvent(const KDEvent* e);
     // Whether a fix passes the simulator's replay and record hooks.
     bool admit(const RawLocation& fix, bool simulated);
+    // Status 2, and the countdown to taking the fix as lost starts again.
+    void fixAvailable();
+    void onFixTimeout();
 
-    boost::scoped_ptr<LocationFilterAverage> filter;
+    LocationSmoother smoother;
     Simulator::AbstractSimulator* simulator;
+    Util::Timer fixTimeout;
 
     static LocationProviderGPS* theLocationProviderGPS;
 };

@@ -31,6 +31,10 @@ public:
     virtual boost::shared_ptr<HttpRequest> issueRequest() const = 0;
     virtual bool needToGatherStatistics() const { return true; }
     virtual bool recieveResponseBodyByParts() const { return false; }
+    // The most body bytes an answer may have; a longer one fails the attempt
+    // with HTTP_BODY_TOO_LARGE_ERROR_CODE. Negative: the engine's default for
+    // the body mode; 0: no limit (see HttpConnection::setMaxBodySize).
+    virtual long long getMaxResponseBodySize() const { return -1; }
     virtual void onResponseRecieved(boost::shared_ptr<HttpResponse> response) { (void)response; }
     virtual void onBytesReceived(const std::vector<unsigned char>& bytes) = 0;
     // The HTTP status of a completed exchange, else a negative finish code.

@@ -62,6 +62,15 @@ OggSpeexEncoder::~OggSpeexEncoder() {
 }
 
 bool OggSpeexEncoder::init() {
+    // Without whole samples of one or two channels no frame could ever fill.
+    if (info.getChannelCount() != 1 && info.getChannelCount() != 2) {
+        KD_ASSERT(false && "Unsupported channel count.");
+        return false;
+    }
+    if (info.getSampleSize() != 1 && info.getSampleSize() != 2) {
+        KD_ASSERT(false && "Unsupported sample size.");
+        return false;
+    }
     const SpeexMode* mode = nullptr;
     switch (info.getSampleRate()) {
         case 8000:
@@ -193,7 +202,7 @@ void OggSpeexEncoder::write(const SoundDataBuffer& aBuffer) {
         return;
     }
     pendingInput.insert(pendingInput.end(), aBuffer.data.begin(), aBuffer.data.end());
-    const size_t frameBytes = static_cast<size_t>(frameSize) * info.getChannelCount() * info.getSampleSize();
+    const size_t frameBytes = getFrameBytes();
     size_t consumed = 0;
     while (pendingInput.size() - consumed >= frameBytes) {
         encodeFrame(pendingInput.data() + consumed);
@@ -223,6 +232,21 @@ void OggSpeexEncoder::encodeFrame(const unsigned char* bytes) {
     speex_encode_int(state, samples.data(), &bits);
     ++frameCount;
     totalSamples += frameSize;
+}
+
+size_t OggSpeexEncoder::getFrameBytes() const {
+    return static_cast<size_t>(frameSize) * info.getChannelCount() * info.getSampleSize();
+}
+
+void OggSpeexEncoder::encodePaddedFrame() {
+    const long long samples =
+        static_cast<long long>(pendingInput.size() / (info.getChannelCount() * info.getSampleSize()));
+    // Zero bytes are silence in both sample sizes.
+    pendingInput.resize(getFrameBytes(), 0);
+    encodeFrame(pendingInput.data());
+    pendingInput.clear();
+    // The granule counts only what was recorded, so decoders trim the padding.
+    totalSamples -= frameSize - samples;
 }
 
 void OggSpeexEncoder::emitPacket() {
@@ -261,7 +285,12 @@ void OggSpeexEncoder::closeWrite() {
         return;
     }
     closed = true;
-    if (framesPerPacket > 0 && frameCount % framesPerPacket != 0) {
+    // Ogg streams end with a page flagged end-of-stream, and only a packet can carry the flag: a
+    // recording shorter than one frame still gets one.
+    if (frameCount == 0) {
+        encodePaddedFrame();
+        emitPacket();
+    } else if (framesPerPacket > 0 && frameCount % framesPerPacket != 0) {
         emitPacket();
     }
     submitHeldPacket(true);

@@ -11,14 +11,17 @@
 
 namespace Sound {
 
-// Encodes 8, 16 or 32 kHz PCM (1- or 2-byte samples) to an Ogg Speex stream
-// held in memory, with the settings of SpeexCFG taken at construction. An
-// encoder for any other rate is unusable and produces nothing.
+// Encodes 8, 16 or 32 kHz PCM (1- or 2-byte samples, one or two channels) to
+// an Ogg Speex stream held in memory, with the settings of SpeexCFG taken at
+// construction. An encoder for any other rate, sample size or channel count
+// is unusable and produces nothing.
 //
 // The last packet carries the end-of-stream flag, as Ogg requires and
 // decoders rely on to trim the last frame to the stream's length, so each
 // packet is held back until the next one is ready or closeWrite() comes. A
-// stream without any audio frame ends with its headers.
+// recording shorter than one frame is padded with silence to one frame, so
+// that it too ends with the flag; its granule still counts only what was
+// recorded. A trailing part frame after whole ones is dropped.
 //
 // Threads: one thread at a time.
 class OggSpeexEncoder : public Encoder {
@@ -47,7 +50,10 @@ private:
     bool init();
     void configureEncoder();
     void writeHeader();
+    size_t getFrameBytes() const;
     void encodeFrame(const unsigned char* bytes);
+    // Encodes what input is pending, less than a frame, as one frame.
+    void encodePaddedFrame();
     void emitPacket();
     void submitHeldPacket(bool endOfStream);
     void appendPage(const ogg_page& page);

@@ -16,21 +16,28 @@ constexpr int kReadChunkBytes = 16 * 1024;
 
 // vorbisfile takes its length from the last complete page and ignores a cut
 // one, so a file cut inside a page would decode as a shorter, valid stream.
-bool endsWithPartialPage(const unsigned char* data, size_t size) {
+// A file cut between pages (where an interrupted write stops) looks whole
+// too, but only a stream's last page carries the end-of-stream flag.
+bool isTruncated(const unsigned char* data, size_t size) {
     ogg_sync_state sync;
     ogg_sync_init(&sync);
     char* buffer = ogg_sync_buffer(&sync, static_cast<long>(size));
-    bool partial = buffer == nullptr;
+    bool truncated = buffer == nullptr;
     if (buffer != nullptr) {
         std::memcpy(buffer, data, size);
         ogg_sync_wrote(&sync, static_cast<long>(size));
         ogg_page page;
-        while (ogg_sync_pageseek(&sync, &page) != 0) {
+        bool lastEndsStream = false;
+        for (long found = ogg_sync_pageseek(&sync, &page); found != 0;
+             found = ogg_sync_pageseek(&sync, &page)) {
+            if (found > 0) {
+                lastEndsStream = ogg_page_eos(&page) != 0;
+            }
         }
-        partial = sync.fill > sync.returned;
+        truncated = sync.fill > sync.returned || !lastEndsStream;
     }
     ogg_sync_clear(&sync);
-    return partial;
+    return truncated;
 }
 
 }  // namespace
@@ -95,7 +102,7 @@ bool OggVorbisDecoder::decode() {
     }
     const ogg_int64_t total = ov_pcm_total(&file, -1);
     const vorbis_info* info = ov_info(&file, -1);
-    if (endsWithPartialPage(sourceData, sourceSize)) {
+    if (isTruncated(sourceData, sourceSize)) {
         Logger::log(Logger::Warning, "Ogg Vorbis: the file is truncated\n");
         return fail();
     }

@@ -31,8 +31,10 @@ std::string StartupRequest::buildUrl() const {
     KD_ASSERT(!host.empty());
     UrlBuilder builder(host);
     builder.setAdditionPath(startupData->startupPath);
-    builder.addStringParam("uuid", startupData->uuid);
-    builder.addStringParam("lang", startupData->lang);
+    // Both come from outside (the uuid from the server's own answer): unescaped, a space or
+    // "&" in them breaks the URL or adds parameters, and "+" arrives as a space.
+    builder.addStringParam("uuid", Util::UrlCoder::urlEncodeString(startupData->uuid));
+    builder.addStringParam("lang", Util::UrlCoder::urlEncodeString(startupData->lang));
     for (const StartupParams::value_type& param : params) {
         builder.addStringParam(Util::UrlCoder::urlEncodeString(param.first),
                                Util::UrlCoder::urlEncodeString(param.second));

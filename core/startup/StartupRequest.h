@@ -24,6 +24,8 @@ public:
 
     bool isReadyToPerform() const override { return true; }
     boost::shared_ptr<Network::HttpRequest> issueRequest() const override;
+    // Hosts and feature sections: a few kilobytes.
+    long long getMaxResponseBodySize() const override { return 256 << 10; }
     void onBytesReceived(const std::vector<unsigned char>& bytes) override;
     void onFinished(int code) override;
 

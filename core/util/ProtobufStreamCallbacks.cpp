@@ -4,6 +4,7 @@
 
 #include <climits>
 
+#include "io/BoundedReader.h"
 #include "io/InputStream.h"
 
 namespace Util {
@@ -13,14 +14,12 @@ ProtobufStreamCallbacks::ProtobufStreamCallbacks(IO::InputStream* stream) {
     if (!stream) {
         return;
     }
-    const long long left = stream->available();
-    const int size = left <= 0 ? 0 : (left > INT_MAX ? INT_MAX : static_cast<int>(left));
-    if (size == 0) {
-        return;
+    // Grows with what arrives, not with what available() claims; positions are ints.
+    std::vector<char> bytes;
+    if (IO::BoundedReader::readAll(*stream, INT_MAX, bytes) == IO::BoundedReader::TooLong) {
+        bytes.resize(INT_MAX);
     }
-    buffer.resize(size);
-    const int got = stream->read(buffer.data(), size);
-    buffer.resize(got > 0 ? got : 0);
+    buffer.assign(bytes.begin(), bytes.end());
 }
 
 bool ProtobufStreamCallbacks::Next(const void** data, int* size) {

@@ -3,6 +3,7 @@
 #include <KD/kd.h>
 
 #include <iomanip>
+#include <locale>
 
 UrlBuilder::UrlBuilder(const std::string& hostPortAndPath) : hostPortAndPath(hostPortAndPath) {
     resetParamStream();
@@ -79,5 +80,7 @@ std::ostringstream& UrlBuilder::beginParam(const std::string& name) {
 void UrlBuilder::resetParamStream() {
     paramStream.str(std::string());
     paramStream.clear();
+    // Coordinates must keep their decimal point whatever locale the application chose.
+    paramStream.imbue(std::locale::classic());
     paramStream << std::fixed << std::setprecision(DEFAULT_PRECISION);
 }

@@ -21,13 +21,9 @@ public:
     // Parses bytes, gunzipping them first when gzipped (bytes that are not gzip data are parsed
     // as they are). True when the document reports no error.
     static bool load(const std::vector<unsigned char>& bytes, bool gzipped, TiXmlDocument& doc);
-    // Parses everything the stream has left; the document's previous content is dropped.
-    // Documents nested deeper than kMaxDepth elements are refused unparsed (TinyXML would spend
-    // a stack frame per level), as is one whose XML declaration is not plain name="value" pairs.
+    // Parses everything the stream has left through XmlLoader with XmlLimits::forAnswers(); the
+    // document's previous content is dropped. A refusal is logged with its reason.
     static bool load(IO::InputStream* stream, TiXmlDocument& doc);
-
-    // Far beyond any answer or settings file we read, and shallow enough for any thread's stack.
-    static const int kMaxDepth = 256;
 
     // The element's text, or defaultValue when it has none.
     static std::string getText(const TiXmlElement* element, const std::string& defaultValue);

@@ -26,6 +26,8 @@ public:
     bool isReadyToPerform() const override;
     int getPriority() const override { return 0; }
     boost::shared_ptr<Network::HttpRequest> issueRequest() const override;
+    // A position or an error: a few hundred bytes.
+    long long getMaxResponseBodySize() const override { return 64 << 10; }
     void onResponseRecieved(boost::shared_ptr<Network::HttpResponse> response) override;
     void onBytesReceived(const std::vector<unsigned char>& bytes) override;
     void onFinished(int code) override;

@@ -36,6 +36,7 @@ HttpConnection::HttpConnection(boost::shared_ptr<HttpRequest> request,
       id(id),
       requestPath(request ? pathOf(request->getUrl()) : std::string()),
       wholeBody(true),
+      maxBodySize(-1),
       started(false),
       cancelled(false) {
     KD_ASSERT(request);
@@ -60,6 +61,10 @@ void HttpConnection::setOnBodyDataReceivedCallback(OnBodyDataReceivedCallback ca
     this->wholeBody = wholeBody;
 }
 
+void HttpConnection::setMaxBodySize(long long bytes) {
+    maxBodySize = bytes;
+}
+
 void HttpConnection::start() {
     KD_ASSERT(!started);
     if (started || cancelled) {
@@ -73,7 +78,8 @@ void HttpConnection::start() {
         deliveries->flush();
         return;
     }
-    transfer = boost::make_shared<HttpTransfer>(request, id, speedCollector, wholeBody, deliveries,
+    const long long bodyLimit = maxBodySize >= 0 ? maxBodySize : (wholeBody ? kDefaultMaxWholeBodySize : 0);
+    transfer = boost::make_shared<HttpTransfer>(request, id, speedCollector, wholeBody, bodyLimit, deliveries,
                                                 weak_from_this());
     // Offline: the request would only fail, and later; say so at once.
     if (kdGetNetworkReachabilityStatusZVR() == 0) {

@@ -111,12 +111,13 @@ int classify(CURLcode result, bool reachedServer) {
 
 HttpTransfer::HttpTransfer(const boost::shared_ptr<HttpRequest>& request, int id,
                            const boost::weak_ptr<NetworkSpeedCollector>& speedCollector, bool wholeBody,
-                           const boost::shared_ptr<HttpDeliveryQueue>& deliveries,
+                           long long maxBodySize, const boost::shared_ptr<HttpDeliveryQueue>& deliveries,
                            const boost::weak_ptr<HttpConnection>& connection)
     : request(request),
       id(id),
       speedCollector(speedCollector),
       wholeBody(wholeBody),
+      maxBodySize(maxBodySize),
       deliveries(deliveries),
       connection(connection),
       bodyStream(request->hasFixedBody() ? boost::shared_ptr<HttpRequest::HttpBodyStream>()
@@ -141,6 +142,8 @@ HttpTransfer::HttpTransfer(const boost::shared_ptr<HttpRequest>& request, int id
       chunkedResponse(false),
       stoppedAfterAnswer(false),
       badAnswer(false),
+      bodyBytesReceived(0),
+      bodyTooLarge(false),
       sentReported(false),
       finished(false),
       deliveriesQueued(false) {
@@ -302,6 +305,11 @@ bool HttpTransfer::getDeadline(Clock::time_point& deadline) const {
 }
 
 void HttpTransfer::complete(CURLcode result) {
+    if (bodyTooLarge) {
+        kdLogFormatMessage("HttpConnection %d: the body is larger than %lld bytes", id, maxBodySize);
+        finish(HTTP_BODY_TOO_LARGE_ERROR_CODE);
+        return;
+    }
     if (stoppedAfterAnswer) {
         finish(HTTP_FINISHED_OK);
         return;
@@ -505,6 +513,13 @@ size_t HttpTransfer::receiveBody(char* data, size_t length) {
         receivePaused = true;
         return CURL_WRITEFUNC_PAUSE;
     }
+    // A server may stream for ever, each byte resetting the silence timeout.
+    if (maxBodySize > 0 && static_cast<long long>(length) > maxBodySize - bodyBytesReceived) {
+        bodyTooLarge = true;
+        wholeBodyData.reset();
+        return 0;
+    }
+    bodyBytesReceived += static_cast<long long>(length);
     const unsigned char* bytes = reinterpret_cast<const unsigned char*>(data);
     boost::shared_ptr<NetworkSpeedCollector> target = collector();
     boost::shared_ptr<DataChunk> chunk;
@@ -519,11 +534,41 @@ size_t HttpTransfer::receiveBody(char* data, size_t length) {
         deliveriesQueued = true;
         return length;
     }
+    keepWholeBody(bytes, length);
+    return length;
+}
+
+void HttpTransfer::keepWholeBody(const unsigned char* bytes, size_t length) {
+    const int statusCode = head.getStatusCode();
+    const bool errorAnswer = statusCode < 200 || statusCode > 299;
     if (!wholeBodyData) {
         wholeBodyData = boost::make_shared<DataChunk>();
+        wholeBodyData->reserve(bodyCapacity(errorAnswer));
     }
-    wholeBodyData->insert(wholeBodyData->end(), bytes, bytes + length);
-    return length;
+    size_t kept = length;
+    if (errorAnswer) {
+        const size_t limit = HttpConnection::kMaxKeptErrorBodySize;
+        kept = std::min(length, limit - std::min(wholeBodyData->size(), limit));
+    }
+    wholeBodyData->insert(wholeBodyData->end(), bytes, bytes + kept);
+}
+
+// The body is held in one block reserved at its first byte. Grown step by
+// step instead, it would leave the smaller blocks behind with the allocator,
+// still resident, and take twice its size. The block's pages are touched only
+// as the body arrives.
+size_t HttpTransfer::bodyCapacity(bool errorAnswer) const {
+    long long capacity = maxBodySize;
+    if (errorAnswer) {
+        const long long kept = static_cast<long long>(HttpConnection::kMaxKeptErrorBodySize);
+        capacity = capacity > 0 ? std::min(capacity, kept) : kept;
+    }
+    // libcurl delivers no more than a Content-Length announces.
+    const long long announced = head.toResponse().getContentLength();
+    if (announced >= 0 && (capacity <= 0 || announced < capacity)) {
+        capacity = announced;
+    }
+    return static_cast<size_t>(std::max(0LL, capacity));
 }
 
 size_t HttpTransfer::onUploadRead(char* buffer, size_t size, size_t count, void* self) {
@@ -594,6 +639,7 @@ void HttpTransfer::finish(int code) {
             deliveries->pushBodyData(wholeBodyData);
         }
     }
+    wholeBodyData.reset();
     deliveries->pushFinished(code);
     deliveriesQueued = true;
     // The caller hears of the finish before the collector does.

@@ -31,7 +31,7 @@ public:
 
     HttpTransfer(const boost::shared_ptr<HttpRequest>& request, int id,
                  const boost::weak_ptr<NetworkSpeedCollector>& speedCollector, bool wholeBody,
-                 const boost::shared_ptr<HttpDeliveryQueue>& deliveries,
+                 long long maxBodySize, const boost::shared_ptr<HttpDeliveryQueue>& deliveries,
                  const boost::weak_ptr<HttpConnection>& connection);
     ~HttpTransfer();
 
@@ -101,6 +101,9 @@ private:
     bool headEnded();
     void deliverResponse();
     size_t receiveBody(char* data, size_t length);
+    void keepWholeBody(const unsigned char* bytes, size_t length);
+    // What to reserve for a whole body at its first byte; 0 when unbounded.
+    size_t bodyCapacity(bool errorAnswer) const;
     void reportSent();
     bool isFramingFault(CURLcode result) const;
     void finish(int code);
@@ -111,6 +114,8 @@ private:
     const int id;
     const boost::weak_ptr<NetworkSpeedCollector> speedCollector;
     const bool wholeBody;
+    // 0: no limit.
+    const long long maxBodySize;
     const boost::shared_ptr<HttpDeliveryQueue> deliveries;
     const boost::weak_ptr<HttpConnection> connection;
     const boost::shared_ptr<HttpRequest::HttpBodyStream> bodyStream;
@@ -154,6 +159,9 @@ private:
     // have followed, or at a head whose framing cannot be trusted.
     bool stoppedAfterAnswer;
     bool badAnswer;
+    // Body bytes of the response taken so far, kept or not.
+    long long bodyBytesReceived;
+    bool bodyTooLarge;
     bool sentReported;
     bool finished;
     // Something was pushed to the caller since the last flush.

@@ -56,6 +56,7 @@ protected:
         config.scanTimeout = 3;
         config.sendTimeout = 7;
         config.quiet = true;
+        configure(config);
         server.reset(new DevServer::Server(config, dataFolder));
         ASSERT_TRUE(server->start());
         pal::postAppResumed();
@@ -119,6 +120,8 @@ protected:
     }
 
     DevServer::Journal journal() const { return server->journal(); }
+
+    virtual void configure(DevServer::Config& config) { (void)config; }
 
     std::string dataFolder;
     std::unique_ptr<DevServer::Server> server;
@@ -191,7 +194,8 @@ TEST_F(EndToEndTest, TunnelDriveHandsOverToServerPositioningAndBack) {
         }
     }
     // Satellite fixes, then the server's position in the tunnel, then
-    // satellite fixes again.
+    // satellite fixes again; when the track has ended and no fix comes any
+    // more, the server's position once more.
     std::string sources;
     for (const Location::Location& location : positions.heard) {
         const char source = location.precision == Location::PrecisionSatellite ? 's' : 'n';
@@ -204,7 +208,7 @@ TEST_F(EndToEndTest, TunnelDriveHandsOverToServerPositioningAndBack) {
             EXPECT_NEAR(11.5866, location.longitude, 0.0015);
         }
     }
-    EXPECT_EQ("sns", sources);
+    EXPECT_EQ("snsn", sources);
     EXPECT_EQ(points.size(), player.getPlayedCount());
 }
 
@@ -241,3 +245,28 @@ TEST_F(EndToEndTest, UploadsArriveDecodedWithTheChunksCollected) {
 }
 
 }  // namespace
+
+// The uuid comes from the server's answer and the language from the platform: a space, "&",
+// "+" or a non-ASCII letter in them must reach the server as they are, not break the URL (the
+// request would fail locally and be retried for ever) nor add parameters.
+class HostileStartupValuesTest : public EndToEndTest {
+protected:
+    void configure(DevServer::Config& config) override { config.uuidPrefix = "id 7&lang=xx+\xC3\xA9%41-"; }
+};
+
+TEST_F(HostileStartupValuesTest, ReachTheServerUnchangedAndTheStartupBecomesReady) {
+    pal::setLocale("d\xC3\xA9 x", "A&B+C");
+    startApplication();
+    ASSERT_TRUE(StartupData::getInstance()->startupReady);
+
+    const DevServer::Journal seen = journal();
+    ASSERT_EQ(2u, seen.startups.size());
+    const std::string uuid = "id 7&lang=xx+\xC3\xA9%41-1";
+    EXPECT_EQ(uuid, seen.startups[0].answeredUuid);
+    EXPECT_EQ(uuid, seen.startups[1].sentUuid);
+    EXPECT_EQ(uuid, StartupData::getInstance()->uuid);
+    for (const DevServer::StartupRecord& startup : seen.startups) {
+        EXPECT_EQ("d\xC3\xA9 x-A&B+C", startup.params.at("lang"));
+        EXPECT_EQ("1", startup.params.at("utf"));
+    }
+}

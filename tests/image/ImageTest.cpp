@@ -2,6 +2,7 @@
 // for PNG, cjpeg for JPEG; see data/make_images.py), and against input that
 // is damaged, truncated or too large.
 #include <pal/Simulation.h>
+#include <sys/resource.h>
 
 #include <boost/make_shared.hpp>
 #include <cstdlib>
@@ -45,6 +46,85 @@ Bytes netpbmPixels(const Bytes& file) {
     }
     return Bytes(file.begin() + i, file.end());
 }
+
+// A JPEG that is all header: both sides, the sampling factors of each
+// component (h << 4 | v), one quantisation table, one Huffman table of each
+// kind, a scan with no data and the end marker. A progressive file's scan
+// covers the first component's DC coefficients, a baseline file's scan every
+// component, so that it is a single-scan file.
+Bytes jpegHeaderOnly(unsigned side, const Bytes& sampling, bool progressive) {
+    Bytes out = {0xFF, 0xD8};
+    auto segment = [&out](unsigned char marker, const Bytes& body) {
+        const size_t length = body.size() + 2;
+        out.insert(out.end(), {0xFF, marker, static_cast<unsigned char>(length >> 8),
+                               static_cast<unsigned char>(length & 0xFF)});
+        out.insert(out.end(), body.begin(), body.end());
+    };
+    Bytes quantisation(65, 1);
+    quantisation[0] = 0;
+    segment(0xDB, quantisation);
+    const unsigned char high = static_cast<unsigned char>(side >> 8);
+    const unsigned char low = static_cast<unsigned char>(side & 0xFF);
+    Bytes frame = {8, high, low, high, low, static_cast<unsigned char>(sampling.size())};
+    for (size_t i = 0; i < sampling.size(); ++i) {
+        frame.insert(frame.end(), {static_cast<unsigned char>(i + 1), sampling[i], 0});
+    }
+    segment(progressive ? 0xC2 : 0xC0, frame);
+    // One code of length 1 in each table: DC difference 0, AC end of block.
+    for (unsigned char tableClass : {0x00, 0x10}) {
+        Bytes huffman(18, 0);
+        huffman[0] = tableClass;
+        huffman[1] = 1;
+        segment(0xC4, huffman);
+    }
+    const size_t inScan = progressive ? 1 : sampling.size();
+    Bytes scan = {static_cast<unsigned char>(inScan)};
+    for (size_t i = 0; i < inScan; ++i) {
+        scan.insert(scan.end(), {static_cast<unsigned char>(i + 1), 0x00});
+    }
+    scan.insert(scan.end(), {0, static_cast<unsigned char>(progressive ? 0 : 63), 0});
+    segment(0xDA, scan);
+    out.insert(out.end(), {0xFF, 0xD9});
+    return out;
+}
+
+// The first 97 bytes of an RGBA PNG declaring side x side pixels: signature,
+// header and the start of the data.
+Bytes pngHeaderOnly(unsigned side) {
+    Bytes png = readData("rgba8.png");
+    for (int i = 0; i < 4; ++i) {
+        png[16 + i] = static_cast<unsigned char>(side >> (24 - 8 * i));
+        png[20 + i] = static_cast<unsigned char>(side >> (24 - 8 * i));
+    }
+    const unsigned long crc = crc32(0, png.data() + 12, 17);
+    for (int i = 0; i < 4; ++i) {
+        png[29 + i] = static_cast<unsigned char>(crc >> (24 - 8 * i));
+    }
+    png.resize(97);
+    return png;
+}
+
+// Lets the address space of this process grow by at most extraBytes.
+void limitAddressSpaceGrowth(rlim_t extraBytes) {
+    std::ifstream status("/proc/self/status");
+    std::string line;
+    rlim_t sizeKb = 0;
+    while (std::getline(status, line)) {
+        if (line.compare(0, 7, "VmSize:") == 0) {
+            sizeKb = std::stoul(line.substr(7));
+        }
+    }
+    const rlimit limit = {sizeKb * 1024 + extraBytes, sizeKb * 1024 + extraBytes};
+    setrlimit(RLIMIT_AS, &limit);
+}
+
+#if defined(__SANITIZE_ADDRESS__)
+#define MAPCORE_ADDRESS_SANITIZER 1
+#elif defined(__has_feature)
+#if __has_feature(address_sanitizer)
+#define MAPCORE_ADDRESS_SANITIZER 1
+#endif
+#endif
 
 class ImageTest : public PalTest {};
 
@@ -198,6 +278,60 @@ TEST_F(ImageTest, ImagesLargerThanTheLimitAreRefusedBeforeDecoding) {
     }
     EXPECT_FALSE(decode(jpeg, Image::JPEG));
     EXPECT_EQ(countLogLines("JPEG: 24x32767 is larger than 8192x8192"), 1);
+}
+
+TEST_F(ImageTest, ProgressiveHeadersDeclaringHugeImagesAreRefusedBeforeTheLibraryBuffersThem) {
+    // Under 170 bytes each, declaring 64 Mpx: 4:2:0, 4:4:4 and gray.
+    for (const Bytes& sampling : {Bytes{0x22, 0x11, 0x11}, Bytes{0x11, 0x11, 0x11}, Bytes{0x11}}) {
+        clearLog();
+        const Bytes jpeg = jpegHeaderOnly(8192, sampling, true);
+        EXPECT_LT(jpeg.size(), 170u);
+        EXPECT_FALSE(decode(jpeg, Image::JPEG)) << sampling.size();
+        EXPECT_EQ(countLogLines("JPEG: buffering the image would take more than"), 1) << sampling.size();
+    }
+    // Real progressive files of moderate size still decode, data or not.
+    const boost::shared_ptr<Image> image =
+        decode(jpegHeaderOnly(1024, {0x22, 0x11, 0x11}, true), Image::JPEG);
+    ASSERT_TRUE(image);
+    EXPECT_EQ(image->getWidth(), 1024u);
+    EXPECT_TRUE(decode(readData("progressive.jpg"), Image::JPEG));
+}
+
+TEST_F(ImageTest, TenComponentsAreRefusedBeforeTheLibraryAllocatesForThem) {
+#ifdef MAPCORE_ADDRESS_SANITIZER
+    GTEST_SKIP() << "an address-space limit and AddressSanitizer's shadow memory do not mix";
+#endif
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    const Bytes jpeg = jpegHeaderOnly(8192, Bytes(10, 0x11), true);
+    EXPECT_LT(jpeg.size(), 170u);
+    // Decoding it would first ask for 1.25 GiB of coefficients.
+    EXPECT_EXIT(
+        {
+            limitAddressSpaceGrowth(64 << 20);
+            const bool refused =
+                !decode(jpeg, Image::JPEG) &&
+                countLogLines("JPEG: 10 components in colour space 0 are not supported") == 1;
+            std::_Exit(refused ? 0 : 1);
+        },
+        ::testing::ExitedWithCode(0), "");
+}
+
+TEST_F(ImageTest, RunningOutOfMemoryForThePixelsGivesNothing) {
+#ifdef MAPCORE_ADDRESS_SANITIZER
+    GTEST_SKIP() << "an address-space limit and AddressSanitizer's shadow memory do not mix";
+#endif
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    const Bytes png = pngHeaderOnly(8192);
+    const Bytes jpeg = jpegHeaderOnly(8192, {0x22, 0x11, 0x11}, false);
+    // 256 MiB and 192 MiB of pixels, in an address space that may grow by 64 MiB.
+    EXPECT_EXIT(
+        {
+            limitAddressSpaceGrowth(64 << 20);
+            const bool refused = !decode(png, Image::PNG) && !decode(jpeg, Image::JPEG) &&
+                                 countLogLines("Image: no memory for 8192x8192 pixels") == 2;
+            std::_Exit(refused ? 0 : 1);
+        },
+        ::testing::ExitedWithCode(0), "");
 }
 
 TEST_F(ImageTest, UnknownFormatsAndMissingSourcesGiveNothing) {

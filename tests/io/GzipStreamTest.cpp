@@ -172,6 +172,49 @@ TEST_F(GzipStreamTest, DamagedCompressedDataFailsInsteadOfPassingThrough) {
     }
 }
 
+// Made by Python's zlib.compress(b"hello", 6) and gzip.compress(b"hello", mtime=0).
+const std::vector<unsigned char> kPythonZlibHello = {0x78, 0x9c, 0xcb, 0x48, 0xcd, 0xc9, 0xc9,
+                                                     0x07, 0x00, 0x06, 0x2c, 0x02, 0x15};
+const std::vector<unsigned char> kPythonGzipHello = {0x1f, 0x8b, 0x08, 0x00, 0x00, 0x00, 0x00, 0x00, 0x02,
+                                                     0x03, 0xcb, 0x48, 0xcd, 0xc9, 0xc9, 0x07, 0x00, 0x86,
+                                                     0xa6, 0x10, 0x36, 0x05, 0x00, 0x00, 0x00};
+
+TEST_F(GzipStreamTest, StreamsFromPythonCutAnywhereFailEvenAtTheirFirstByte) {
+    for (const Bytes& whole : {kPythonZlibHello, kPythonGzipHello}) {
+        EXPECT_EQ(bytesOf("hello"), gunzip(whole));
+        for (size_t cut = 1; cut < whole.size(); ++cut) {
+            clearLog();
+            IO::ByteArrayInputStream in(whole.data(), static_cast<int>(cut));
+            IO::Zip::GzipInputStream unzipped(&in);
+            EXPECT_EQ(0, unzipped.available()) << whole[0] << " cut at " << cut;
+            EXPECT_TRUE(hasLogLine("GzipInputStream::read error -5")) << whole[0] << " cut at " << cut;
+        }
+    }
+}
+
+TEST_F(GzipStreamTest, TextThatBeginsLikeAZlibHeaderPassesThroughButDamagedZlibDataFails) {
+    // Each begins with two characters that pass the zlib header check.
+    for (const char* text : {"x^2 + y^2 = r^2", "80 km/h", "hb", "x^",
+                             "HK\n\tstra\xc3\x9f"
+                             "e"}) {
+        EXPECT_EQ(bytesOf(text), gunzip(bytesOf(text))) << text;
+    }
+    EXPECT_TRUE(logLines().empty());
+
+    // Python's zlib.compress(..., 3) begins with the same "x^".
+    const Bytes levelThree = {0x78, 0x5e, 0xab, 0x88, 0x33, 0x52, 0xd0, 0x56, 0xa8, 0x04, 0x92, 0xb6,
+                              0x0a, 0x45, 0x40, 0x32, 0x23, 0x3f, 0x27, 0xa5, 0x58, 0x21, 0x3f, 0x4f,
+                              0x21, 0xb5, 0x2c, 0xb5, 0xa8, 0x52, 0xa1, 0x20, 0x3f, 0x33, 0xaf, 0x44,
+                              0x21, 0x3f, 0x4d, 0xa1, 0x24, 0x23, 0x55, 0x21, 0x39, 0xb3, 0x28, 0x39,
+                              0x27, 0x95, 0x0b, 0x00, 0x9e, 0x5e, 0x10, 0xba};
+    EXPECT_EQ(bytesOf("x^2 + y^2 = r^2 holds on every point of the circle\n"), gunzip(levelThree));
+    for (size_t at = 2; at < levelThree.size(); ++at) {
+        Bytes damaged = levelThree;
+        damaged[at] ^= 0x01;
+        EXPECT_EQ(Bytes(), gunzip(damaged)) << at;
+    }
+}
+
 TEST_F(GzipStreamTest, ContentBeyondTheLimitStopsWithAnErrorAndAnImplausibleTrailerIsNotTrusted) {
     // One zero byte past the limit, deflated a MiB at a time.
     const Bytes mebibyte(1 << 20, 0);

@@ -12,6 +12,7 @@
 #include "location/simulator/GpxReader.h"
 #include "location/simulator/GpxRecorder.h"
 #include "support/PalTest.h"
+#include "support/ScopedLocale.h"
 
 namespace {
 
@@ -93,7 +94,7 @@ TEST(GpxReaderTest, DamagedOrHostileFilesGiveAnErrorAndNoPoints) {
         {track("<trkpt lat=\"1\" lon=\"2\"><ele>1e30</ele></trkpt>"), "bad <ele>"},
         {track("<trkpt lat=\"1\" lon=\"2\"><extensions><m:precision>1.5</m:precision></extensions></trkpt>"),
          "bad <precision>"},
-        {deep, "nested too deeply"},
+        {deep, "elements nested deeper than 64 levels"},
     };
     for (const Case& c : cases) {
         std::vector<GpxPoint> points(1);
@@ -102,6 +103,69 @@ TEST(GpxReaderTest, DamagedOrHostileFilesGiveAnErrorAndNoPoints) {
         EXPECT_TRUE(points.empty()) << c.error;
         EXPECT_NE(std::string::npos, error.find(c.error)) << error;
     }
+}
+
+std::string repeat(const std::string& text, int times) {
+    std::string all;
+    for (int i = 0; i < times; ++i) {
+        all += text;
+    }
+    return all;
+}
+
+// Each of these once crashed the reader, read past its buffer or took 16 s; they go through the
+// library's one XML loading path now, whose checks come before TinyXML sees the text.
+TEST(GpxReaderTest, HostileFilesAreRefusedBeforeTheParserSeesThem) {
+    const std::string point = "<trkpt lat=\"1\" lon=\"2\"/>";
+    std::string manyAttributes = "<gpx";
+    for (int i = 0; i < 40000; ++i) {
+        manyAttributes += " a" + std::to_string(i) + "=\"\"";
+    }
+    manyAttributes += "><trk><trkseg>" + point + "</trkseg></trk></gpx>";
+    const struct {
+        std::string text;
+        const char* error;
+    } cases[] = {
+        // 2.2 MB: end tags before the root took the old nesting count below zero, and TinyXML's
+        // recursion through the open elements after them overflowed the stack.
+        {repeat("</x>", 200000) + repeat("<a>", 200000), "end tag </x> without a start tag"},
+        {manyAttributes, "element <gpx> has more than 32 attributes"},
+        // Ends inside a UTF-8 sequence: TinyXML stepped two bytes past the unpadded buffer.
+        {"<?xml version=\"1.0\" encoding=\"UTF-8\"?><x a=\"\xF0", "not well-formed XML"},
+    };
+    for (const auto& c : cases) {
+        std::vector<GpxPoint> points;
+        std::string error;
+        EXPECT_FALSE(GpxReader::parse(bytesOf(c.text), points, error));
+        EXPECT_TRUE(points.empty());
+        EXPECT_NE(std::string::npos, error.find(c.error)) << error;
+    }
+}
+
+class GpxLocaleTest : public PalTest {};
+
+// Under a decimal-comma locale the recorder once wrote lat="48,125" and the reader refused
+// its own track.
+TEST_F(GpxLocaleTest, RecordedTrackReadsBackUnderADecimalCommaLocale) {
+    ScopedLocale german("de_DE.UTF-8");
+    if (!german.active()) {
+        GTEST_SKIP() << "no de_DE.UTF-8 locale";
+    }
+    Simulator::GpxRecorder recorder;
+    recorder.recordLocation(48.125f, -11.5f, 3.25f, 90.5f, 4.75f, 520.25f, 2);
+    const std::string text = recorder.toGpx();
+    EXPECT_NE(std::string::npos, text.find("lat=\"48.125\" lon=\"-11.5\"")) << text;
+
+    std::vector<GpxPoint> points;
+    std::string error;
+    ASSERT_TRUE(GpxReader::parse(bytesOf(text), points, error)) << error;
+    ASSERT_EQ(1u, points.size());
+    EXPECT_EQ(48.125f, points[0].latitude);
+    EXPECT_EQ(-11.5f, points[0].longitude);
+    EXPECT_EQ(3.25f, points[0].speed);
+    EXPECT_EQ(90.5f, points[0].course);
+    EXPECT_EQ(4.75f, points[0].accuracy);
+    EXPECT_EQ(520.25f, points[0].altitude);
 }
 
 // Fix and status events as the location provider would receive them.

@@ -282,4 +282,73 @@ TEST_F(LocationFilterTest, KalmanSmoothsRestartsAfterResetAndIgnoresInvalidFixes
     EXPECT_LT(metresBetween(elsewhere, kalman.filter(elsewhere)), 3.0f);
 }
 
+TEST_F(LocationFilterTest, GapLongerThanAFewFixIntervalsRestartsTheChain) {
+    Location::LocationFilterAverage chain;
+    for (int i = 1; i <= 5; ++i) {
+        chain.filter(fix(0, 0, i));
+    }
+    // An hour later, 60 m on: not averaged with where the receiver stood then.
+    const Fix later = fix(60, 0, 3605);
+    EXPECT_LT(metresBetween(later, chain.filter(later)), 0.5f);
+    // Within the gap the chain still smooths.
+    const Fix soon = fix(60, 3, 3605 + 5);
+    EXPECT_LT(metresBetween(later, chain.filter(soon)), 0.5f);
+}
+
+// Each fix reports its speed; one reports 100 m/s with its position still on
+// the track.
+TEST_F(LocationFilterTest, SpeedSpikeDoesNotThrowThePositionAhead) {
+    Location::LocationFilterAverage chain;
+    Location::LocationFilterKalman kalman;
+    for (int i = 1; i <= 12; ++i) {
+        const float reported = i == 6 ? 100.0f : 10.0f;
+        const Fix onTrack = fix(10.0f * i, 0, i, reported, 0.0f, 8.0f);
+        EXPECT_LT(metresBetween(onTrack, chain.filter(onTrack)), 2.0f) << i;
+        EXPECT_LT(metresBetween(onTrack, kalman.filter(onTrack)), 3.0f) << i;
+    }
+}
+
+TEST_F(LocationFilterTest, PositionAverageNearThePoleStaysOnTheMap) {
+    Location::LocationFilterAveragePosition average;
+    Location::LocationFilterKalman kalman;
+    // Heading north at 30 m/s towards the pole, the last fix on it.
+    for (int i = 0; i < 3; ++i) {
+        const Fix heading =
+            fixNear(89.9996f + 0.0002f * i, 10.0f, 0, 0, 5.0f, (i + 1) * kSecond, 30.0f, 0.0f);
+        const Fix out = average.filter(heading);
+        EXPECT_LE(out.latitude, 90.0f) << i;
+        EXPECT_LE(kalman.filter(heading).latitude, 90.0f) << i;
+    }
+}
+
+TEST_F(LocationFilterTest, MinDistanceHoldsPositionsOnTheEquatorAndPrimeMeridian) {
+    for (const Fix& first :
+         {fixNear(0.0f, 10.0f, 0, 0, 20.0f, kSecond), fixNear(10.0f, 0.0f, 0, 0, 20.0f, kSecond)}) {
+        Location::LocationFilterMinDistance minDistance;
+        minDistance.filter(first);
+        const Fix jittered = fixNear(first.latitude, first.longitude, 3, 3, 20.0f, 2 * kSecond);
+        const Fix held = minDistance.filter(jittered);
+        EXPECT_EQ(first.latitude, held.latitude);
+        EXPECT_EQ(first.longitude, held.longitude);
+    }
+}
+
+TEST_F(LocationFilterTest, MissingAltitudeIsLeftOutOfTheAverage) {
+    Location::LocationFilterAveragePosition average;
+    const float altitudes[] = {100.0f, -1.0f, 110.0f};
+    Fix out;
+    for (int i = 0; i < 3; ++i) {
+        Fix standing = fix(0, 0, i + 1);
+        standing.altitude = altitudes[i];
+        out = average.filter(standing);
+    }
+    EXPECT_FLOAT_EQ(105.0f, out.altitude);
+    for (int i = 0; i < 3; ++i) {
+        Fix unknown = fix(0, 0, i + 4);
+        unknown.altitude = -1.0f;
+        out = average.filter(unknown);
+    }
+    EXPECT_EQ(-1.0f, out.altitude);
+}
+
 }  // namespace

@@ -9,6 +9,7 @@
 #include <vector>
 
 #include "location/LocationManager.h"
+#include "location/LocationProviderGPS.h"
 #include "network/NetworkManager.h"
 #include "startup/StartupData.h"
 #include "support/PalTest.h"
@@ -84,11 +85,22 @@ protected:
     bool waitForNetworkFixes(size_t count) {
         return waitFor([this, count] { return positions.networkFixes() >= count; });
     }
-    // Whether network positioning still runs: with the cell never answering,
-    // any attempt in the next minute leaves a cell request open.
+    // Whether network positioning still runs while satellite fixes keep
+    // coming: with the cell never answering, any attempt in the next minute
+    // leaves a cell request open.
     bool positioningRunsInTheNextMinute() {
         pal::scriptCellInfo(pal::Answer::never(), {});
-        advanceMs(60000);
+        for (int second = 0; second < 60; ++second) {
+            advanceMs(1000);
+            satelliteFix(48.2f);
+        }
+        return pal::pendingCellInfoRequests() > 0;
+    }
+    // From now on a network positioning attempt stays open, so that
+    // positioningAsked() tells whether one started.
+    void holdPositioningAttempts() { pal::scriptCellInfo(pal::Answer::never(), {}); }
+    bool positioningAsked() {
+        pump();
         return pal::pendingCellInfoRequests() > 0;
     }
     // Until the server has answered the next request and the answer has been
@@ -136,7 +148,7 @@ TEST_F(LocationHandoverTest, NetworkPositionsUntilTheFirstSatelliteFix) {
     EXPECT_EQ(Location::PrecisionSatellite, positions.heard[2].precision);
     EXPECT_EQ(Location::PrecisionSatellite, manager->getPrecision());
     EXPECT_FALSE(positioningRunsInTheNextMinute());
-    EXPECT_EQ(3u, positions.heard.size());
+    EXPECT_EQ(2u, positions.networkFixes());
 }
 
 TEST_F(LocationHandoverTest, LosingTheSatelliteFixHandsOverToNetworkAndBack) {
@@ -216,6 +228,64 @@ TEST_F(LocationHandoverTest, BadPositioningAnswersNeverReachListenersAsPositions
     EXPECT_EQ(Location::PrecisionNone, positions.heard.back().precision);
     EXPECT_LT(positions.heard.back().accuracy, 0.0f);
     EXPECT_EQ(overall, manager->getPrecision());
+}
+
+// The receiver reports searching, then a fix (which stops network
+// positioning), then searching again: that is a lost fix too.
+TEST_F(LocationHandoverTest, FixLostAgainAfterAFixWhileSearchingHandsOver) {
+    resume();
+    ASSERT_TRUE(waitForNetworkFixes(1));
+    pal::injectLocationStatus(1);
+    pump();
+    satelliteFix(48.2f);
+    holdPositioningAttempts();
+    ASSERT_FALSE(positioningAsked());
+    positions.precisionChanges.clear();
+
+    pal::injectLocationStatus(1);
+    EXPECT_TRUE(positioningAsked());
+    ASSERT_EQ(1u, positions.precisionChanges.size());
+    EXPECT_EQ(std::make_pair(2, 1), positions.precisionChanges[0]);
+}
+
+// A receiver that just stops delivering (no status event) is taken as having
+// lost its fix after the timeout, and the server's first answer is delivered.
+TEST_F(LocationHandoverTest, FixesStoppingWithoutAStatusHandOverAfterTheTimeout) {
+    resume();
+    ASSERT_TRUE(waitForNetworkFixes(1));
+    satelliteFix(48.2f);
+    advanceMs(1000);
+    satelliteFix(48.2001f);
+    holdPositioningAttempts();
+    advanceMs(Location::LocationProviderGPS::kFixLostAfterMs - 1);
+    ASSERT_FALSE(positioningAsked());
+    EXPECT_EQ(Location::PrecisionSatellite, manager->getPrecision());
+
+    pal::scriptCellInfo(pal::Answer::after(0), {true, 4711, 815, "26201", "262"});
+    advanceMs(1);
+    ASSERT_TRUE(waitForNetworkFixes(2));
+    EXPECT_EQ(Location::PrecisionNetwork, manager->getPrecision());
+    EXPECT_EQ(Location::PrecisionNetwork, manager->getLastLocation().precision);
+}
+
+TEST_F(LocationHandoverTest, AnswerWithoutAccuracyAfterHandoverKeepsNetworkPrecision) {
+    resume();
+    ASSERT_TRUE(waitForNetworkFixes(1));
+    satelliteFix(48.2f);
+    pal::injectLocationStatus(1);
+    pump();
+    ASSERT_TRUE(waitForNetworkFixes(2));
+    ASSERT_EQ(Location::PrecisionNetwork, manager->getPrecision());
+    positions.precisionChanges.clear();
+
+    reply.body = "<location><coordinates latitude=\"48\" longitude=\"11\" accuracy=\"-5\"/></location>";
+    server.on("/cellid_location/", reply);
+    const size_t heardBefore = positions.heard.size();
+    advanceMs(15000);
+    ASSERT_TRUE(waitFor([&] { return positions.heard.size() > heardBefore; }));
+    EXPECT_EQ(Location::PrecisionNone, positions.heard.back().precision);
+    EXPECT_EQ(Location::PrecisionNetwork, manager->getPrecision());
+    EXPECT_TRUE(positions.precisionChanges.empty());
 }
 
 }  // namespace

@@ -9,6 +9,7 @@
 #include "location/AbstractSimulator.h"
 #include "location/LocationManager.h"
 #include "location/LocationProvider.h"
+#include "location/LocationTestSupport.h"
 #include "support/PalTest.h"
 
 namespace {
@@ -180,14 +181,56 @@ TEST_F(LocationManagerTest, SimulatorReplaysAndRecordsFixes) {
     manager->setSimulator(nullptr);
 }
 
-TEST_F(LocationManagerTest, StatusEventsOutsideTheKnownValuesAssert) {
-    pal::injectLocationStatus(1);
-    pal::injectLocationStatus(2);
-    pump();
-    EXPECT_TRUE(assertions().empty());
+TEST_F(LocationManagerTest, UnknownSatelliteStatusIsLoggedAndIgnored) {
+    deliver(fixAt(0));
     pal::injectLocationStatus(7);
     pump();
-    expectAssertion("false");
+    EXPECT_TRUE(hasLogLine("LocationProviderGPS: unknown satellite status 7 ignored"));
+    EXPECT_EQ(Location::PrecisionSatellite, manager->getPrecision());
+    EXPECT_EQ(0, pal::pendingCellInfoRequests());
+}
+
+// The chain gives a fix it has no course for yet (the first after an 83 m
+// jump, without bearing) network precision; the receiver still has its fix.
+TEST_F(LocationManagerTest, SatelliteFixWithoutCourseKeepsSatellitePrecision) {
+    deliver(fixAt(0));
+    deliver(fixAt(10));
+    ASSERT_EQ(Location::PrecisionSatellite, manager->getPrecision());
+    heard.precisionChanges.clear();
+    deliver(fixAt(200, 10.0f, -1.0f, -1.0f));
+    ASSERT_EQ(3u, heard.locations.size());
+    EXPECT_EQ(Location::PrecisionNetwork, heard.locations.back().precision);
+    EXPECT_EQ(Location::PrecisionSatellite, manager->getPrecision());
+    EXPECT_TRUE(heard.precisionChanges.empty());
+}
+
+// Jitter around a standing point, the first fix furthest off: the chain holds
+// it, the Kalman filter settles near the middle, metres apart.
+TEST_F(LocationManagerTest, SmootherSwitchesWhileRunningWithoutAJump) {
+    EXPECT_EQ(Location::LocationSmoother::Chain, manager->getSmoother());
+    deliver(fixAt(6.0f, 20.0f, -1.0f, -1.0f));
+    for (int i = 0; i < 30; ++i) {
+        deliver(fixAt(i % 2 == 0 ? -4.0f : 4.0f, 20.0f, -1.0f, -1.0f));
+    }
+    const std::vector<Location::Location> chainOnly = heard.locations;
+    for (Location::LocationSmoother::Kind kind :
+         {Location::LocationSmoother::Kalman, Location::LocationSmoother::Chain}) {
+        manager->setSmoother(kind);
+        EXPECT_EQ(kind, manager->getSmoother());
+        const size_t before = heard.locations.size();
+        for (int i = 0; i < 10; ++i) {
+            deliver(fixAt(i % 2 == 0 ? -4.0f : 4.0f, 20.0f, -1.0f, -1.0f));
+        }
+        ASSERT_EQ(before + 10, heard.locations.size());
+        float moved = 0.0f;
+        for (size_t i = before; i < heard.locations.size(); ++i) {
+            const float step = location_test::metresBetween(heard.locations[i - 1], heard.locations[i]);
+            EXPECT_LT(step, 1.5f) << i;
+            moved += step;
+        }
+        // It did go over to the other filter's position.
+        EXPECT_GT(moved, 3.0f);
+    }
 }
 
 // A provider of the test's own, to reach the reports' state check.

@@ -118,6 +118,21 @@ INSTANTIATE_TEST_SUITE_P(
                       RetryCase{"LimitZeroRunsOnce", 503, nullptr, 0, 1, 503}),
     [](const ::testing::TestParamInfo<RetryCase>& info) { return std::string(info.param.name); });
 
+TEST_F(NetworkManagerTest, ATaskBoundsTheBodyItAccepts) {
+    const std::string url = serve("/big", 200, std::string(5000, 'b'));
+    Task small = makeTask(url);
+    small->maxBodySize = 4999;
+    Task enough = makeTask(url);
+    enough->maxBodySize = 5000;
+    manager->submit(small, policy(1000, 0));
+    manager->submit(enough, policy(1000, 0));
+    EXPECT_TRUE(settle([&] { return small->finished() && enough->finished(); }));
+    EXPECT_EQ((std::vector<int>{Network::HTTP_BODY_TOO_LARGE_ERROR_CODE}), small->finishCodes);
+    EXPECT_TRUE(small->body.empty());
+    EXPECT_EQ((std::vector<int>{200}), enough->finishCodes);
+    EXPECT_EQ(5000u, enough->body.size());
+}
+
 TEST_F(NetworkManagerTest, RetryWaitsItsIntervalOrWhileUnreachableUntilTheNetworkReturns) {
     Task task = makeTask(serve("/busy", 503));
     task->onResponse = [&] {

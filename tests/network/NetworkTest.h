@@ -41,6 +41,7 @@ public:
     }
     bool needToGatherStatistics() const override { return gatherStatistics; }
     bool recieveResponseBodyByParts() const override { return byParts; }
+    long long getMaxResponseBodySize() const override { return maxBodySize; }
     void onResponseRecieved(boost::shared_ptr<Network::HttpResponse> response) override {
         note("response " + std::to_string(response->getStatusCode()));
         if (onResponse) {
@@ -75,6 +76,7 @@ public:
     bool gatherStatistics = true;
     bool byParts = false;
     bool streamsBody = false;
+    long long maxBodySize = -1;
     std::string name;
     std::vector<std::string>* sharedLog = nullptr;
     std::function<void()> onResponse, onFinish, onRetry;

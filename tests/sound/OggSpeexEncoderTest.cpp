@@ -146,7 +146,7 @@ TEST_F(OggSpeexEncoderTest, HeaderAndCommentPacketsHoldTheStreamDescription) {
     OggSpeexEncoder encoder(SoundDataInfo(SoundDataInfo::NONE, 1, 16000, 2, -1), 8);
     encoder.closeWrite();
     const std::vector<Packet> packets = packetsOf(encoder.read(-1)->data);
-    ASSERT_EQ(packets.size(), 2u);
+    ASSERT_EQ(packets.size(), 3u);  // and the silent frame that ends the stream
 
     const std::vector<unsigned char>& header = packets[0].bytes;
     ASSERT_EQ(header.size(), 80u);
@@ -231,6 +231,27 @@ TEST_F(OggSpeexEncoderTest, UnsupportedRateMakesAnEncoderThatWritesNothing) {
     expectAssertion("false && \"Unsupported bit rate.\"");
     EXPECT_FALSE(encoder.isInitialized());
     EXPECT_TRUE(Sound::encode(&encoder, tone(44100, 5000, 440))->data.empty());
+}
+
+TEST_F(OggSpeexEncoderTest, NoChannelsOrNoWholeSampleMakesAnEncoderThatWritesNothing) {
+    struct Case {
+        int channels;
+        int sampleSize;
+        const char* assertion;
+    };
+    for (const Case c : {Case{0, 2, "false && \"Unsupported channel count.\""},
+                         Case{3, 2, "false && \"Unsupported channel count.\""},
+                         Case{1, 0, "false && \"Unsupported sample size.\""},
+                         Case{1, 4, "false && \"Unsupported sample size.\""}}) {
+        const SoundDataInfo info(SoundDataInfo::NONE, c.channels, 8000, c.sampleSize, -1);
+        OggSpeexEncoder encoder(info, 6);
+        expectAssertion(c.assertion);
+        EXPECT_FALSE(encoder.isInitialized());
+        SoundDataBuffer input;
+        input.info = info;
+        input.data.assign(4000, 1);
+        EXPECT_TRUE(Sound::encode(&encoder, input)->data.empty());
+    }
 }
 
 TEST_F(OggSpeexEncoderTest, BadArgumentsAssert) {
@@ -331,5 +352,44 @@ TEST_P(SpeexdecTest, StandardDecoderKeepsLengthAndPitch) {
 }
 
 INSTANTIATE_TEST_SUITE_P(SampleSizes, SpeexdecTest, ::testing::Values(2, 1));
+
+// A recording stopped before its first slice: no input, or less than one frame.
+class ShortRecordingTest : public OggSpeexEncoderTest, public ::testing::WithParamInterface<int> {
+protected:
+    // Runs tool on the stream saved as a file, followed by arguments; its exit status, and what
+    // it printed in output.
+    int runOn(const std::vector<unsigned char>& stream, const std::string& tool, const std::string& arguments,
+              std::string& output) {
+        std::filesystem::create_directories(hostPath("/tmp"));
+        const std::string spx = hostPath("/tmp") + "/short.spx";
+        const std::string log = hostPath("/tmp") + "/tool.log";
+        std::ofstream(spx, std::ios::binary)
+            .write(reinterpret_cast<const char*>(stream.data()), static_cast<std::streamsize>(stream.size()));
+        const int status =
+            std::system((tool + " '" + spx + "' " + arguments + " >'" + log + "' 2>&1").c_str());
+        std::ifstream in(log);
+        output.assign(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
+        return status;
+    }
+};
+
+TEST_P(ShortRecordingTest, EndsWithOnePaddedFrameFlaggedEndOfStream) {
+    const int samples = GetParam();
+    OggSpeexEncoder encoder(SoundDataInfo(SoundDataInfo::NONE, 1, 8000, 2, -1), 5);
+    const std::vector<unsigned char> stream = Sound::encode(&encoder, tone(8000, samples, 440))->data;
+
+    const std::vector<Packet> packets = packetsOf(stream);
+    ASSERT_EQ(packets.size(), 3u);
+    EXPECT_TRUE(packets[2].endOfStream);
+    EXPECT_EQ(packets[2].granule, std::min(160 - encoder.getLookahead(), samples));
+
+    // Debian's tools read it as a complete stream.
+    std::string output;
+    ASSERT_EQ(runOn(stream, "ogginfo", "", output), 0) << output;
+    EXPECT_EQ(output.find("WARNING"), std::string::npos) << output;
+    EXPECT_EQ(runOn(stream, "speexdec --quiet", "'" + hostPath("/tmp") + "/short.wav'", output), 0) << output;
+}
+
+INSTANTIATE_TEST_SUITE_P(Lengths, ShortRecordingTest, ::testing::Values(0, 1, 100, 159));
 
 }  // namespace

@@ -127,6 +127,30 @@ TEST_F(OggVorbisDecoderTest, TruncatedFileFailsWithEmptyOutput) {
     }
 }
 
+TEST_F(OggVorbisDecoderTest, FileCutBetweenPagesFailsAsTruncated) {
+    const std::vector<unsigned char> whole = makeVorbisFile(2, 44100, 5 * 44100);
+    std::vector<size_t> pageEnds;
+    for (size_t at = 0; at + 27 <= whole.size();) {
+        size_t body = 0;
+        for (int i = 0; i < whole[at + 26]; ++i) {
+            body += whole[at + 27 + i];
+        }
+        at += 27 + whole[at + 26] + body;
+        pageEnds.push_back(at);
+    }
+    ASSERT_GT(pageEnds.size(), 4u);
+    ASSERT_EQ(pageEnds.back(), whole.size());
+    // From the end of the headers on, every cut still leaves a stream vorbisfile opens.
+    for (size_t page = 2; page + 1 < pageEnds.size(); ++page) {
+        const SoundDataBuffer input =
+            bufferOf(std::vector<unsigned char>(whole.begin(), whole.begin() + pageEnds[page]));
+        SoundDataBuffer output = bufferOf({7, 7});
+        EXPECT_FALSE(OggVorbisDecoder(output, input).decode()) << "cut after page " << page;
+        EXPECT_TRUE(output.data.empty()) << "cut after page " << page;
+    }
+    EXPECT_EQ(countLogLines("Ogg Vorbis: the file is truncated"), static_cast<int>(pageEnds.size()) - 3);
+}
+
 TEST_F(OggVorbisDecoderTest, DeclaredLengthBeyondTheSamplesFailsWithEmptyOutput) {
     for (int64_t granule : {int64_t{200000}, int64_t{1} << 32, int64_t{1} << 40, INT64_MAX / 2}) {
         // Several audio pages, so that the first one fixes where the stream starts.

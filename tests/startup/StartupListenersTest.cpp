@@ -12,6 +12,7 @@
 #include "startup/impl/TelephonyStartupListener.h"
 #include "startup/impl/WifiStartupListener.h"
 #include "support/PalTest.h"
+#include "support/ScopedLocale.h"
 #include "wireless/WifiScanResult.h"
 
 namespace {
@@ -77,6 +78,18 @@ TEST_F(StartupListenersTest, DefaultParametersDescribeTheDevice) {
         EXPECT_EQ(0u, params.count("deviceid")) << "no device-id support, no key";
         EXPECT_EQ(0u, params.count("ll")) << "no location yet";
     }
+}
+
+TEST_F(StartupListenersTest, NumbersKeepTheirDecimalPointUnderADecimalCommaLocale) {
+    ScopedLocale german("de_DE.UTF-8");
+    if (!german.active()) {
+        GTEST_SKIP() << "no de_DE.UTF-8 locale";
+    }
+    pal::setDeviceString(KD_STRING_APP_VERSION_ZVR, "3.259");
+    pal::setDotsPerInch(240);
+    StartupParams params = collectDefault();
+    EXPECT_EQ("325", params["app_version"]);
+    EXPECT_EQ("1.5", params["scalefactor"]);
 }
 
 TEST_F(StartupListenersTest, DeviceIdIsSentWhenSupportedEvenWhenEmpty) {

@@ -163,6 +163,24 @@ TEST_F(NetworkSpeedCollectorImplTest, ReportsFromAnotherThreadWhileOwnerPumpsLos
     EXPECT_TRUE(pop().empty());
 }
 
+// The statistics collector goes (stopped, destroyed) while the HTTP engine's
+// thread holds the speed collector for a report: the last reference then goes
+// on that thread, with the report still queued for the owner thread.
+TEST_F(NetworkSpeedCollectorImplTest, LastReferenceDroppedOnAReportingThreadIsDeletedOnTheOwnerThread) {
+    boost::shared_ptr<NetworkSpeedCollectorImpl> shared = NetworkSpeedCollectorImpl::create();
+    const boost::weak_ptr<NetworkSpeedCollectorImpl> watched = shared;
+    std::thread reporter([held = std::move(shared)]() mutable {
+        held->onRequestFinished(7);
+        held.reset();
+    });
+    reporter.join();
+    EXPECT_TRUE(watched.expired());
+
+    // The queued report, then the deletion, run here; nothing asserts.
+    pump();
+    pump();
+}
+
 TEST_F(NetworkSpeedCollectorImplTest, HandedOutRecordsAreNoLongerChanged) {
     boost::shared_ptr<Network::HttpConnection> connection = idleConnection(5, "/a");
     collector->onRequestSent(5, connection.get());

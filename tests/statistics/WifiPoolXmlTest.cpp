@@ -15,6 +15,7 @@
 #include "statistics/wifipool/UploadedTag.h"
 #include "statistics/wifipool/WifiPoolTag.h"
 #include "support/PalTest.h"
+#include "support/ScopedLocale.h"
 
 namespace {
 
@@ -105,6 +106,14 @@ const XmlCase kCases[] = {
 class WifiPoolXmlTest : public ::testing::TestWithParam<XmlCase> {};
 
 TEST_P(WifiPoolXmlTest, WritesExactText) {
+    EXPECT_EQ(GetParam().expected, text(GetParam().make()));
+}
+
+TEST_P(WifiPoolXmlTest, WritesTheSameTextUnderADecimalCommaLocale) {
+    ScopedLocale german("de_DE.UTF-8");
+    if (!german.active()) {
+        GTEST_SKIP() << "no de_DE.UTF-8 locale";
+    }
     EXPECT_EQ(GetParam().expected, text(GetParam().make()));
 }
 

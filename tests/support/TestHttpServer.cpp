@@ -1,14 +1,13 @@
 #include "support/TestHttpServer.h"
 
 #include <arpa/inet.h>
+#include <httplib.h>
 #include <netinet/in.h>
 #include <strings.h>
 #include <sys/socket.h>
 #include <unistd.h>
 
 #include <chrono>
-
-#include <httplib.h>
 
 namespace {
 
@@ -199,6 +198,18 @@ void TestHttpServer::Impl::answer(const Reply& reply, const httplib::Request& re
                     std::size_t count = std::min(chunkSize, body.size() - offset);
                     return sink.write(body.data() + offset, count);
                 });
+            break;
+        }
+        case Reply::Repeated: {
+            const std::size_t total = body.size() * reply.repeatCount;
+            response.set_chunked_content_provider(contentType,
+                                                  [body, total](std::size_t offset, httplib::DataSink& sink) {
+                                                      if (offset >= total || body.empty()) {
+                                                          sink.done();
+                                                          return true;
+                                                      }
+                                                      return sink.write(body.data(), body.size());
+                                                  });
             break;
         }
         case Reply::DropMidBody:

@@ -26,7 +26,8 @@ public:
             DropMidBody,       // announces the body's length, sends half of it, closes
             StallBeforeReply,  // answers nothing until releaseStalls()
             StallMidBody,      // sends the headers and half the body, then waits as above
-            Echo               // the request body back, with the request's Content-Type
+            Echo,              // the request body back, with the request's Content-Type
+            Repeated           // the body chunked, repeatCount times over, or until the client leaves
         };
         Mode mode = Whole;
         int status = 200;
@@ -34,6 +35,7 @@ public:
         std::string contentType = "text/plain";
         std::vector<std::pair<std::string, std::string> > headers;
         std::size_t chunkSize = 1024;
+        std::size_t repeatCount = 1;
         // Real-time pause before the answer starts.
         int delayMs = 0;
     };

@@ -7,8 +7,8 @@
 #include <vector>
 
 #include "devserver/Text.h"
-#include "devserver/XmlShape.h"
 #include "statistics/wifipool/UploadConstants.h"
+#include "util/XmlLoader.h"
 
 namespace DevServer {
 
@@ -170,19 +170,12 @@ bool UploadDecoder::readDocument(UploadRecord& record) const {
     if (record.document.find('\0') != std::string::npos) {
         return refuse(record, kBadRequest, "document holds a NUL byte");
     }
-    if (!XmlShape::check(record.document, kMaxDepth, error)) {
-        return refuse(record, kBadRequest, "not well-formed XML: " + error);
-    }
-    // The collector writes windows-1251, one byte per character. Read so, TinyXML never steps
-    // over several bytes at once, which in its UTF-8 mode could swallow a '<' or a quote that the
-    // markup check saw, or step past the end of the text.
+    // The collector's documents are small and nest five deep; the limits leave room for any
+    // honest client while keeping a hostile body linear in time and memory.
+    const Util::XmlLimits limits{maxDocumentBytes, static_cast<int>(kMaxDepth), 32, maxDocumentBytes / 2};
     TiXmlDocument document;
-    document.Parse(record.document.c_str(), nullptr, TIXML_ENCODING_LEGACY);
-    if (document.Error()) {
-        return refuse(record, kBadRequest,
-                      std::string("not well-formed XML: ") + document.ErrorDesc() + " at line " +
-                          std::to_string(document.ErrorRow()) + ", column " +
-                          std::to_string(document.ErrorCol()));
+    if (!Util::XmlLoader::parse(record.document.data(), record.document.size(), limits, document, error)) {
+        return refuse(record, kBadRequest, error);
     }
     const TiXmlElement* root = document.RootElement();
     if (root == nullptr || root->ValueStr() != "wifipool") {

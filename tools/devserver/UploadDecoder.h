@@ -9,7 +9,7 @@ namespace DevServer {
 
 // Undoes what the Wi-Fi pool collector does to an upload: takes the "data"
 // part of the multipart body (split by cpp-httplib), unscrambles it with the
-// build's key, gunzips it and checks the XML document with TinyXML. The
+// build's key, gunzips it and reads the XML document through the library's loader. The
 // multipart boundary must be the build's (the client may lengthen it, never
 // change its start). Untrusted input: any bytes give a record, never a crash.
 // Any thread.

@@ -23,10 +23,47 @@ bool hasGzipHeader(const std::vector<unsigned char>& input) {
     return !input.empty() && input[0] == 0x1f && (input.size() == 1 || input[1] == 0x8b);
 }
 
-// Deflate method, a window of at most 32 KiB and the header check of RFC 1950.
+// Deflate method, a window of at most 32 KiB and the header check of RFC 1950. A lone method byte
+// is a zlib stream cut short, as a lone gzip magic byte is.
 bool hasZlibHeader(const std::vector<unsigned char>& input) {
-    return input.size() >= 2 && (input[0] & 0x0f) == 8 && (input[0] >> 4) <= 7 &&
-           ((input[0] << 8) | input[1]) % 31 == 0;
+    return !input.empty() && (input[0] & 0x0f) == 8 && (input[0] >> 4) <= 7 &&
+           (input.size() == 1 || ((input[0] << 8) | input[1]) % 31 == 0);
+}
+
+// Length of the UTF-8 sequence led by byte, 0 when it cannot lead one.
+int utf8SequenceLength(unsigned char byte) {
+    if (byte < 0x80) {
+        return 1;
+    }
+    if (byte >= 0xc2 && byte <= 0xdf) {
+        return 2;
+    }
+    if (byte >= 0xe0 && byte <= 0xef) {
+        return 3;
+    }
+    return byte >= 0xf0 && byte <= 0xf4 ? 4 : 0;
+}
+
+// Printable UTF-8 with tabs and line breaks. One in every 31 pairs of characters such as "x^"
+// or "80" passes the zlib header check; deflated data, damaged or not, is almost never text.
+bool isPlainText(const std::vector<unsigned char>& input) {
+    for (size_t at = 0; at < input.size();) {
+        const unsigned char byte = input[at];
+        if ((byte < 0x20 && byte != '\t' && byte != '\n' && byte != '\r') || byte == 0x7f) {
+            return false;
+        }
+        const int length = utf8SequenceLength(byte);
+        if (length == 0 || input.size() - at < static_cast<size_t>(length)) {
+            return false;
+        }
+        for (int i = 1; i < length; ++i) {
+            if ((input[at + i] & 0xc0) != 0x80) {
+                return false;
+            }
+        }
+        at += length;
+    }
+    return true;
 }
 
 // The content size a gzip trailer states, when it is one the input could hold.
@@ -94,16 +131,21 @@ GzipInputStream::GzipInputStream(InputStream* compressed) {
         Logger::log(Logger::Error, "GzipInputStream: could not read the compressed input");
         return;
     }
-    if (!input.empty() && !hasGzipHeader(input) && !hasZlibHeader(input)) {
+    const bool looksCompressed = input.empty() || hasGzipHeader(input) || hasZlibHeader(input);
+    const int result = looksCompressed ? inflateAll(input) : Z_STREAM_END;
+    // A lone byte is a cut header, not text; more text that fails to inflate was never compressed.
+    const bool textAfterAll = result != Z_STREAM_END && input.size() > 1 && isPlainText(input);
+    if (!looksCompressed || textAfterAll) {
         // Not compressed data: the bytes are the content as they are.
         data.swap(input);
-    } else if (!inflateAll(input)) {
+    } else if (result != Z_STREAM_END) {
+        fail(result);
         return;
     }
     inner.reset(new ByteArrayInputStream(data.data(), static_cast<int>(data.size())));
 }
 
-bool GzipInputStream::inflateAll(const std::vector<unsigned char>& input) {
+int GzipInputStream::inflateAll(const std::vector<unsigned char>& input) {
     // The content is sized before it is held, so that memory peaks at the content itself, never
     // at a grown copy of it: from the gzip trailer when it is plausible, else by inflating once
     // just to count.
@@ -115,31 +157,31 @@ bool GzipInputStream::inflateAll(const std::vector<unsigned char>& input) {
         result = inflateInto(input, data.data(), data.size(), produced);
         if (result == Z_STREAM_END) {
             data.resize(produced);
-            return true;
+            return result;
         }
         // A full buffer means more content than the trailer says (several members): count it.
         if (produced < data.size()) {
-            return fail(result);
+            return result;
         }
     }
     result = inflateInto(input, nullptr, 0, size);
     if (result != Z_STREAM_END) {
-        return fail(result);
+        return result;
     }
     std::vector<unsigned char>().swap(data);
     data.resize(size);
     result = inflateInto(input, data.data(), data.size(), produced);
-    return result == Z_STREAM_END && produced == size ? true : fail(result);
+    // A second pass that disagrees with the first is a failure, never short content.
+    return produced == size ? result : Z_STREAM_ERROR;
 }
 
-bool GzipInputStream::fail(int result) {
+void GzipInputStream::fail(int result) {
     if (result == kTooLarge) {
         Logger::log(Logger::Error, "GzipInputStream: content larger than %d bytes", kMaxInflatedSize);
     } else {
         Logger::log(Logger::Error, "GzipInputStream::read error %d", result);
     }
     std::vector<unsigned char>().swap(data);
-    return false;
 }
 
 void GzipInputStream::enableExceptions() {

@@ -9,7 +9,8 @@ namespace IO {
 namespace Zip {
 
 // Inflates a whole zlib or gzip stream when constructed and then reads from memory. Input without
-// a gzip or zlib header comes through unchanged; damaged, truncated or oversized compressed data
+// a gzip or zlib header comes through unchanged, and so does text that only happens to begin like
+// a zlib header and does not inflate; damaged, truncated or oversized compressed data
 // leaves the stream empty (available 0, reads -1, or IO::Exception once exceptions are enabled),
 // with the error logged. Not thread-safe: one thread uses the stream.
 class GzipInputStream : public InputStream {
@@ -29,9 +30,10 @@ public:
     void seek(long long offset, KDfileSeekOrigin origin) override;
 
 private:
-    bool inflateAll(const std::vector<unsigned char>& input);
-    // Logs why inflating stopped and drops any partial content; false.
-    bool fail(int result);
+    // Z_STREAM_END with the content in data, else the reason inflating stopped.
+    int inflateAll(const std::vector<unsigned char>& input);
+    // Logs why inflating stopped and drops any partial content.
+    void fail(int result);
 
     std::vector<unsigned char> data;
     boost::shared_ptr<ByteArrayInputStream> inner;

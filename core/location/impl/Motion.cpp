@@ -17,6 +17,11 @@ const float kMaxLatitude = 89.3f;
 // Faster than anything that carries a receiver.
 const float kMaxSpeed = 1.0e4f;
 
+// How far a reported speed may be off the displacement beyond what the two
+// fixes' accuracies explain: speed noise of a receiver, and a turn between
+// fixes that makes the straight displacement shorter than the way driven.
+const float kSpeedSlack = 2.0f;
+
 // Written so that NaN is neither.
 bool hasSpeed(const Location& fix) {
     return fix.speed >= 0.0f && fix.speed <= kMaxSpeed;
@@ -72,6 +77,35 @@ void degreesPerMetre(float latitude, float& latitudeDegrees, float& longitudeDeg
     const float degreesPerRadian = 57.295776f;
     latitudeDegrees = degreesPerRadian / meridian;
     longitudeDegrees = degreesPerRadian / (primeVertical * kdCosf(radians));
+}
+
+Location withBelievableMotion(const Location& previous, const Location& fix) {
+    const float seconds = secondsBetween(previous, fix);
+    if (!hasSpeed(fix) || seconds <= 0.0f) {
+        return fix;
+    }
+    const float moved =
+        CoordConversion::getDistance(previous.latitude, previous.longitude, fix.latitude, fix.longitude);
+    const float unexplained = kdFabsf(fix.speed * seconds - moved);
+    const float tolerance = previous.accuracy + fix.accuracy + kSpeedSlack * seconds;
+    if (!(unexplained > tolerance)) {
+        return fix;
+    }
+    Location believed = fix;
+    believed.speed = moved / seconds;
+    const float dx = static_cast<float>(fix.x) - static_cast<float>(previous.x);
+    const float dy = static_cast<float>(fix.y) - static_cast<float>(previous.y);
+    believed.bearing = dx != 0.0f || dy != 0.0f ? BearingMath::bearingOf(dx, dy) : -1.0f;
+    CoordConversion::vMtovXY(believed.latitude, believed.speed, believed.speedXY);
+    believed.bearingXY = believed.bearing;
+    return believed;
+}
+
+float clampLatitude(float latitude) {
+    if (latitude > 90.0f) {
+        return 90.0f;
+    }
+    return latitude < -90.0f ? -90.0f : latitude;
 }
 
 float secondsBetween(const Location& older, const Location& newer) {

@@ -26,6 +26,17 @@ bool isMoving(const Location& fix);
 // on the WGS 84 ellipsoid; for displacements of up to a few kilometres.
 void degreesPerMetre(float latitude, float& latitudeDegrees, float& longitudeDegrees);
 
+// The fix as far as its reported motion can be believed: when the speed it
+// reports cannot be reconciled with how far it moved since `previous` (a
+// receiver's speed glitch), the displacement is the better witness, and the
+// fix comes back with speed and bearing taken from it. Fixes without a speed,
+// or received at the same time as `previous`, come back unchanged.
+Location withBelievableMotion(const Location& previous, const Location& fix);
+
+// Latitude brought back within +-90: carrying or smoothing a position near a
+// pole can take it past the pole.
+float clampLatitude(float latitude);
+
 // Seconds between the receive times of two fixes; 0 when the clock did not
 // move forward from `older` to `newer`.
 float secondsBetween(const Location& older, const Location& newer);

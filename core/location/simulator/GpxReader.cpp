@@ -2,65 +2,25 @@
 
 #include <tinyxml.h>
 
+#include <algorithm>
 #include <cstdio>
 #include <cstring>
 
+#include "io/BoundedReader.h"
 #include "io/FileManager.h"
 #include "location/simulator/impl/GpxTime.h"
+#include "util/XmlLoader.h"
 
 namespace Simulator {
 
 namespace {
 
-// TinyXML parses and frees elements recursively: nesting is bounded before it
-// sees the text, so a hostile file cannot exhaust the stack. GPX needs ~8.
-const int kMaxNesting = 64;
 const float kMetresPerHdop = 5.0f;
 const float kDefaultAccuracy = 10.0f;
 
-// Deepest element nesting of XML text, counting as a parser does: comments,
-// CDATA, declarations and quoted attribute values are skipped. Stops early
-// with a value above limit.
-int nestingDepth(const std::string& text, int limit) {
-    int depth = 0;
-    int deepest = 0;
-    size_t pos = 0;
-    while ((pos = text.find('<', pos)) != std::string::npos) {
-        if (text.compare(pos, 4, "<!--") == 0) {
-            pos = text.find("-->", pos + 4);
-        } else if (text.compare(pos, 9, "<![CDATA[") == 0) {
-            pos = text.find("]]>", pos + 9);
-        } else if (text.compare(pos, 2, "<?") == 0 || text.compare(pos, 2, "<!") == 0 ||
-                   text.compare(pos, 2, "</") == 0) {
-            depth -= text.compare(pos, 2, "</") == 0 ? 1 : 0;
-            pos = text.find('>', pos + 1);
-        } else {
-            char quote = 0;
-            size_t end = pos + 1;
-            for (; end < text.size(); ++end) {
-                const char c = text[end];
-                if (quote != 0) {
-                    quote = c == quote ? 0 : quote;
-                } else if (c == '"' || c == '\'') {
-                    quote = c;
-                } else if (c == '>' || c == '<') {
-                    break;
-                }
-            }
-            const bool selfClosing = end < text.size() && text[end] == '>' && text[end - 1] == '/';
-            if (!selfClosing && ++depth > deepest) {
-                deepest = depth;
-                if (deepest > limit) {
-                    return deepest;
-                }
-            }
-            pos = end;
-        }
-        if (pos == std::string::npos) {
-            break;
-        }
-    }
-    return deepest;
+// GPX nests about 8 deep and a point with all its values makes some 16 nodes.
+Util::XmlLimits gpxLimits() {
+    return Util::XmlLimits{GpxReader::kMaxBytes, 64, 32, GpxReader::kMaxPoints * 16};
 }
 
 bool isFinite(float value) {
@@ -242,19 +202,13 @@ bool GpxReader::parse(const std::vector<unsigned char>& bytes, std::vector<GpxPo
         error = "file too large";
         return false;
     }
-    const std::string text(bytes.begin(), bytes.end());
-    if (text.find('\0') != std::string::npos) {
+    if (std::find(bytes.begin(), bytes.end(), '\0') != bytes.end()) {
         error = "not a text file";
         return false;
     }
-    if (nestingDepth(text, kMaxNesting) > kMaxNesting) {
-        error = "elements nested too deeply";
-        return false;
-    }
     TiXmlDocument doc;
-    doc.Parse(text.c_str(), nullptr, TIXML_ENCODING_UTF8);
-    if (doc.Error()) {
-        error = std::string("not well-formed XML: ") + doc.ErrorDesc();
+    const char* text = reinterpret_cast<const char*>(bytes.data());
+    if (!Util::XmlLoader::parse(text, bytes.size(), gpxLimits(), doc, error)) {
         return false;
     }
     const TiXmlElement* gpx = doc.RootElement();
@@ -276,16 +230,12 @@ bool GpxReader::readFile(const char* path, std::vector<GpxPoint>& points, std::s
         error = std::string("cannot open ") + path;
         return false;
     }
-    const long long size = stream->available();
-    if (size < 0 || size > static_cast<long long>(kMaxBytes)) {
-        error = std::string("cannot read ") + path;
+    std::vector<char> text;
+    if (IO::BoundedReader::readAll(*stream, kMaxBytes, text) == IO::BoundedReader::TooLong) {
+        error = "file too large";
         return false;
     }
-    std::vector<unsigned char> bytes(static_cast<size_t>(size));
-    if (size > 0 && stream->read(bytes.data(), static_cast<int>(size)) != size) {
-        error = std::string("cannot read ") + path;
-        return false;
-    }
+    const std::vector<unsigned char> bytes(text.begin(), text.end());
     return parse(bytes, points, error);
 }
 

@@ -1,9 +1,8 @@
 #include "location/simulator/GpxRecorder.h"
 
-#include <cstdio>
-
 #include "io/FileManager.h"
 #include "location/simulator/impl/GpxTime.h"
+#include "util/NumberText.h"
 
 namespace Simulator {
 
@@ -21,34 +20,32 @@ const char kFooter[] =
     "</gpx>\n";
 
 // Nine significant digits bring every float back exactly.
-void appendValue(std::string& out, const char* format, float value) {
-    char text[96];
-    std::snprintf(text, sizeof(text), format, static_cast<double>(value));
-    out += text;
+std::string valueText(float value) {
+    return Util::NumberText::significant(value, 9);
+}
+
+void appendValue(std::string& out, const char* name, float value) {
+    out += std::string("          <mapcore:") + name + ">" + valueText(value) + "</mapcore:" + name + ">\n";
 }
 
 void appendPoint(std::string& out, const GpxPoint& point) {
-    char text[128];
-    std::snprintf(text, sizeof(text), "      <trkpt lat=\"%.9g\" lon=\"%.9g\">\n",
-                  static_cast<double>(point.latitude), static_cast<double>(point.longitude));
-    out += text;
+    out += "      <trkpt lat=\"" + valueText(point.latitude) + "\" lon=\"" + valueText(point.longitude) +
+           "\">\n";
     if (point.altitude != -1.0f) {
-        appendValue(out, "        <ele>%.9g</ele>\n", point.altitude);
+        out += "        <ele>" + valueText(point.altitude) + "</ele>\n";
     }
     out += "        <time>" + GpxTime::format(point.timeMs) + "</time>\n";
     out += "        <extensions>\n";
     if (point.speed >= 0.0f) {
-        appendValue(out, "          <mapcore:speed>%.9g</mapcore:speed>\n", point.speed);
+        appendValue(out, "speed", point.speed);
     }
     if (point.course >= 0.0f) {
-        appendValue(out, "          <mapcore:course>%.9g</mapcore:course>\n", point.course);
+        appendValue(out, "course", point.course);
     }
     if (point.accuracy >= 0.0f) {
-        appendValue(out, "          <mapcore:accuracy>%.9g</mapcore:accuracy>\n", point.accuracy);
+        appendValue(out, "accuracy", point.accuracy);
     }
-    std::snprintf(text, sizeof(text), "          <mapcore:precision>%d</mapcore:precision>\n",
-                  point.precision);
-    out += text;
+    out += "          <mapcore:precision>" + std::to_string(point.precision) + "</mapcore:precision>\n";
     out += "        </extensions>\n";
     out += "      </trkpt>\n";
 }

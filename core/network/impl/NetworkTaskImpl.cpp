@@ -102,6 +102,7 @@ void NetworkTaskImpl::start() {
         HttpConnection::OnBodyDataReceivedCallback::make<NetworkTaskImpl,
                                                          &NetworkTaskImpl::onBodyDataRecieved>(this),
         !task->recieveResponseBodyByParts());
+    connection->setMaxBodySize(task->getMaxResponseBodySize());
     connection->start();
     onActivity(self, NetworkManager::NetworkActive);
 }

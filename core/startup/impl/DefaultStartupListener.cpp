@@ -2,7 +2,6 @@
 
 #include <KD/kd.h>
 #include <KD/kdext.h>
-#include <stdlib.h>
 #include <tinyxml.h>
 
 #include <cstdio>
@@ -10,6 +9,7 @@
 #include "location/LocationManager.h"
 #include "startup/StartupData.h"
 #include "util/Logger.h"
+#include "util/NumberText.h"
 
 namespace Startup {
 
@@ -22,15 +22,9 @@ std::string deviceString(KDint id) {
     return value != nullptr ? std::string(value) : std::string();
 }
 
-std::string format(const char* pattern, double a, double b = 0.0) {
-    char buffer[64];
-    snprintf(buffer, sizeof(buffer), pattern, a, b);
-    return buffer;
-}
-
 // "3.259" gives 325: the server compares versions as hundredths.
 std::string appVersion() {
-    const double version = strtod(deviceString(KD_STRING_APP_VERSION_ZVR).c_str(), nullptr);
+    const double version = Util::NumberText::leadingDouble(deviceString(KD_STRING_APP_VERSION_ZVR));
     const double hundredths = version * 100.0;
     // Out-of-range texts would make the conversion undefined; they say nothing anyway.
     const unsigned int value =
@@ -69,13 +63,14 @@ void DefaultStartupListener::addDeviceParams(StartupParams& params) const {
     params["app_platform"] = deviceString(KD_STRING_APP_PLATFORM_ZVR);
     params["app_version"] = appVersion();
     params["build_number"] = deviceString(KD_STRING_BUILD_NUMBER_ZVR);
-    params["scalefactor"] = format("%.1f", kdDotsPerInchZVR() / 160.0);
+    params["scalefactor"] = Util::NumberText::fixed(kdDotsPerInchZVR() / 160.0, 1);
 }
 
 void DefaultStartupListener::addLocationParam(StartupParams& params) const {
     const Location::Location& last = Location::LocationManager::getInstance()->getLastLocation();
     if (last.accuracy >= 0.0f && last.precision != Location::PrecisionNone) {
-        params["ll"] = format("%.6f,%.6f", last.latitude, last.longitude);
+        params["ll"] =
+            Util::NumberText::fixed(last.latitude, 6) + "," + Util::NumberText::fixed(last.longitude, 6);
     }
 }
 

@@ -1,6 +1,6 @@
 #include "statistics/wifipool/GpsDataTag.h"
 
-#include <cstdio>
+#include "util/NumberText.h"
 
 namespace Statistics {
 
@@ -9,16 +9,12 @@ void GpsDataTag::appendNodeName(std::string& out) const {
 }
 
 void GpsDataTag::appendNodeTagText(std::string& out) const {
-    char text[64];
-    std::snprintf(text, sizeof(text), "lat=\"%.6f\" lon=\"%.6f\"", lat, lon);
-    out += text;
+    out += "lat=\"" + Util::NumberText::fixed(lat, 6) + "\" lon=\"" + Util::NumberText::fixed(lon, 6) + "\"";
     if (hasSpeed) {
-        std::snprintf(text, sizeof(text), " speed=\"%.6f\"", speed);
-        out += text;
+        out += " speed=\"" + Util::NumberText::fixed(speed, 6) + "\"";
     }
     if (hasCourse) {
-        std::snprintf(text, sizeof(text), " course=\"%.6f\"", course);
-        out += text;
+        out += " course=\"" + Util::NumberText::fixed(course, 6) + "\"";
     }
 }
 

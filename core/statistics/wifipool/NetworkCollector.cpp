@@ -36,7 +36,7 @@ NetworkCollector::NetworkCollector()
       scanTimeout(kDefaultScanTimeout),
       sendTimeout(kDefaultSendTimeout),
       hasLocation(false),
-      speedCollector(boost::make_shared<NetworkSpeedCollectorImpl>()) {
+      speedCollector(NetworkSpeedCollectorImpl::create()) {
     kdInstallCallback(&NetworkCollector::onScanTimerFiredWrapper, KD_EVENT_TIMER, &scanTimerContext);
     kdInstallCallback(&NetworkCollector::onSendTimerFiredWrapper, KD_EVENT_TIMER, &sendTimerContext);
     Network::NetworkManager::getInstance()->setNetworkSpeedCollector(

@@ -25,6 +25,9 @@ public:
 
 typedef NetworkSpeedCollectorContext Report;
 
+// The user pointer of the events that hand a collector back to its owner thread.
+char deleteEventToken;
+
 }  // namespace
 
 NetworkSpeedCollectorImpl::NetworkSpeedCollectorImpl()
@@ -40,6 +43,32 @@ NetworkSpeedCollectorImpl::NetworkSpeedCollectorImpl()
       onRequestCanceledCallback(
           Util::ThreadCallback::Function::make<NetworkSpeedCollectorImpl,
                                                &NetworkSpeedCollectorImpl::onRequestCanceledImpl>(this)) {}
+
+boost::shared_ptr<NetworkSpeedCollectorImpl> NetworkSpeedCollectorImpl::create() {
+    kdInstallCallback(&NetworkSpeedCollectorImpl::onDeleteEvent, KD_EVENT_USER, &deleteEventToken);
+    return boost::shared_ptr<NetworkSpeedCollectorImpl>(new NetworkSpeedCollectorImpl(),
+                                                        &NetworkSpeedCollectorImpl::deleteOnOwnerThread);
+}
+
+// Its thread callback may only go on the owner thread, where the events it
+// posted wait; deleted elsewhere it would leave them pointing at freed memory.
+void NetworkSpeedCollectorImpl::deleteOnOwnerThread(NetworkSpeedCollectorImpl* collector) {
+    KDThread* owner = collector->threadCallback.getThread();
+    if (kdThreadSelf() == owner) {
+        delete collector;
+        return;
+    }
+    KDEvent* event = kdCreateEvent();
+    event->type = KD_EVENT_USER;
+    event->userptr = &deleteEventToken;
+    event->timestamp = kdGetTimeUST();
+    event->data.p[0] = collector;
+    kdPostThreadEvent(event, owner);
+}
+
+void NetworkSpeedCollectorImpl::onDeleteEvent(const KDEvent* event) {
+    delete static_cast<NetworkSpeedCollectorImpl*>(event->data.p[0]);
+}
 
 void NetworkSpeedCollectorImpl::onRequestSent(int id, Network::HttpConnection* httpConnection) {
     KD_ASSERT(httpConnection);

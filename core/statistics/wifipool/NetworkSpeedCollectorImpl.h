@@ -22,6 +22,12 @@ public:
 
     NetworkSpeedCollectorImpl();
 
+    // The HTTP engine's threads hold the collector while they report, so its
+    // last reference may go on one of them. A collector made here is then
+    // handed back to its owner thread and deleted there, after the reports
+    // queued before. Call on the owner thread.
+    static boost::shared_ptr<NetworkSpeedCollectorImpl> create();
+
     void onRequestSent(int id, Network::HttpConnection* connection) override;
     void onRequestFinished(int id) override;
     void onDataChunkReceived(int id, Network::DataChunk* dataChunk) override;
@@ -44,6 +50,9 @@ private:
     void onRequestCanceledImpl(ContextPtr context);
 
     boost::shared_ptr<RequestInfo> findRequestInfo(int id) const;
+
+    static void deleteOnOwnerThread(NetworkSpeedCollectorImpl* collector);
+    static void onDeleteEvent(const KDEvent* event);
 
     Util::ThreadCallback threadCallback;
     Util::ThreadCallback::Function onRequestSentCallback;

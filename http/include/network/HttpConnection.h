@@ -32,6 +32,14 @@ class HttpTransfer;
 // The destructor cancels; it may run on any thread.
 class HttpConnection : public boost::enable_shared_from_this<HttpConnection> {
 public:
+    // The body limit of a whole-body connection unless setMaxBodySize says
+    // otherwise: the whole body is held in memory until it is complete.
+    static constexpr long long kDefaultMaxWholeBodySize = 32LL << 20;
+    // In whole-body mode, what is kept of the body of an answer outside
+    // 200..299; the rest is received and dropped. Such a body is read at most
+    // for a message.
+    static constexpr std::size_t kMaxKeptErrorBodySize = 64 << 10;
+
     typedef callback<void (*)(boost::shared_ptr<HttpConnection>, int)> OnFinishedCallback;
     typedef callback<void (*)(boost::shared_ptr<HttpConnection>, boost::shared_ptr<HttpResponse>)>
         OnResponseReceivedCallback;
@@ -51,6 +59,14 @@ public:
     // Parts are held back, not piled up, while about a megabyte of them waits
     // for the caller thread; the silence timeout does not run meanwhile.
     void setOnBodyDataReceivedCallback(OnBodyDataReceivedCallback callback, bool wholeBody);
+
+    // The most body bytes the connection receives, whatever the answer's
+    // status; the first byte beyond ends the transfer with
+    // HTTP_BODY_TOO_LARGE_ERROR_CODE. Positive: that many bytes; 0: no limit;
+    // negative (the initial value): kDefaultMaxWholeBodySize in whole-body
+    // mode and no limit in parts mode, whose caller takes the body as it
+    // comes. Set before start().
+    void setMaxBodySize(long long bytes);
 
     // Starts the exchange; the calling thread becomes the caller thread. A
     // connection starts once; starting after cancel() does nothing.
@@ -85,6 +101,7 @@ private:
     OnResponseReceivedCallback onResponseReceived;
     OnBodyDataReceivedCallback onBodyDataReceived;
     bool wholeBody;
+    long long maxBodySize;
     bool started;
     bool cancelled;
     boost::shared_ptr<HttpTransfer> transfer;

@@ -24,6 +24,9 @@ const int HTTP_TLS_ERROR_CODE = -8;
 // No HttpEngine existed when the connection started, or it went away while
 // the connection ran.
 const int HTTP_NO_ENGINE_ERROR_CODE = -9;
+// The answer's body grew beyond the connection's limit (see
+// HttpConnection::setMaxBodySize); the transfer was stopped there.
+const int HTTP_BODY_TOO_LARGE_ERROR_CODE = -10;
 // The platform reports the network as unreachable (at the start or when the
 // transfer failed). The network manager switches to offline mode on it.
 const int HTTP_OFFLINE_ERROR_CODE = -1073741825;
