@@ -3,7 +3,6 @@
 #include <KD/kd.h>
 
 #include <algorithm>
-#include <climits>
 #include <csetjmp>
 #include <cstdio>
 #include <cstring>
@@ -108,12 +107,15 @@ private:
 // What the library may allocate for one image besides the pixels we hold: its
 // row buffers, and for progressive or multi-scan files the coefficients of the
 // whole image, which a header of a hundred bytes can declare by the hundred
-// megabytes. Real files of that kind carry data in proportion.
+// megabytes. Real files of that kind carry data in proportion. No allowed
+// image needs more than the coefficients of 8192 x 8192 pixels in three full
+// components, 384 MiB.
 long libraryMemoryLimit(IO::InputStream* in) {
     const long long base = 16LL << 20;
     const long long perInputByte = 64;
-    const long long inputBytes = std::max(0LL, std::min(in->available(), 1LL << 30));
-    return static_cast<long>(std::min<long long>(base + perInputByte * inputBytes, LONG_MAX));
+    const long long most = base + (384LL << 20);
+    const long long inputBytes = std::max(0LL, std::min(in->available(), most / perInputByte));
+    return static_cast<long>(std::min(base + perInputByte * inputBytes, most));
 }
 
 bool isSupportedColourLayout(j_decompress_ptr cinfo) {

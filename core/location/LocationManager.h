@@ -43,12 +43,14 @@ public:
     //   track                         raw     Chain (default)   Kalman
     //   standing, 20 m accuracy       7.1 m        76 %           22 %
     //   walking                       5.7 m        57 %           31 %
-    //   driving with turns            4.1 m        64 %           53 %
-    //   walking with 150 m outliers  13.3 m        94 %           26 %
+    //   driving with turns            4.1 m        62 %           50 %
+    //   walking with 150 m outliers  13.3 m        24 %           25 %
+    //   long stop, then driving on    4.1 m        63 %           38 %
+    //   speed spike while driving     4.4 m        64 %           48 %
     //
     // The chain holds a standing position still and keeps the behaviour
-    // applications know; the Kalman filter is closer to the truth on every
-    // track but lets the marker drift by a metre or two while standing.
+    // applications know; the Kalman filter is closer to the truth on nearly
+    // every track but lets the marker drift by a metre or two while standing.
     void setSmoother(LocationSmoother::Kind kind);
     LocationSmoother::Kind getSmoother() const;
 

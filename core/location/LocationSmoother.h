@@ -11,8 +11,8 @@ namespace Location {
 // on every fix, so the one selected next has already settled on the track;
 // after a switch the output glides from where the old one put it to the new
 // one's position over kSwitchFixes fixes, so the marker does not jump. Both
-// together cost about ten times building the raw record per fix. Main thread
-// only, like the provider that owns it.
+// together cost about fourteen times building the raw record per fix, well
+// below a microsecond. Main thread only, like the provider that owns it.
 class LocationSmoother : public LocationFilter {
 public:
     enum Kind { Chain = 0, Kalman = 1 };

@@ -5,7 +5,9 @@
 // server (the "cellid" host of the startup answer) with the simulated Wi-Fi
 // and cell of the tunnel; out of the tunnel the satellite fixes take over
 // again. Every handover and every filtered position the application would see
-// is printed.
+// is printed, and each handover with how long it took: from the last
+// satellite fix to the first network position, and from there back to the
+// first satellite fix.
 #include <pal/Simulation.h>
 
 #include <cstdio>
@@ -46,6 +48,8 @@ public:
           positions(0),
           queriesBefore(0),
           lastPrecision(-1),
+          lastSatelliteFixAt(0),
+          firstNetworkPositionAt(0),
           finishTimer(callback<void (*)()>::make<LocationScene, &LocationScene::finish>(this)) {}
 
     ~LocationScene() override { detach(); }
@@ -74,6 +78,7 @@ public:
 
     void onLocationChanged(LocationManager*, const Location::Location& location) override {
         ++positions;
+        reportHandover(location);
         demo::addCount(std::string(precisionName(location.precision)) + " fixes delivered");
         if (location.precision != lastPrecision) {
             demo::say("  ---- positions now from %s ----", precisionName(location.precision));
@@ -104,6 +109,33 @@ private:
             bytes.insert(bytes.end(), buffer, buffer + count);
         }
         return Simulator::GpxReader::parse(bytes, points, error);
+    }
+
+    // Times on the replay clock and, multiplied by the replay rate, in the
+    // drive's own seconds.
+    static void sayHandover(const char* what, KDust from, KDust to) {
+        const double seconds = static_cast<double>(to - from) / 1.0e9;
+        demo::say("  handover %s took %.2f s (%.1f s of the drive)", what, seconds, seconds * kReplayRate);
+    }
+
+    // A satellite-level record is a satellite fix; the chain gives the first
+    // fix after a jump network level until it has a course, so the source is
+    // told by the overall precision as well.
+    void reportHandover(const Location::Location& location) {
+        const KDust now = kdGetTimeUST();
+        const bool satellite = manager->getPrecision() == Location::PrecisionSatellite;
+        if (satellite) {
+            if (firstNetworkPositionAt != 0) {
+                sayHandover("network -> satellite", firstNetworkPositionAt, now);
+                firstNetworkPositionAt = 0;
+            }
+            lastSatelliteFixAt = now;
+        } else if (location.precision == Location::PrecisionNetwork && firstNetworkPositionAt == 0) {
+            firstNetworkPositionAt = now;
+            if (lastSatelliteFixAt != 0) {
+                sayHandover("satellite -> network", lastSatelliteFixAt, now);
+            }
+        }
     }
 
     // What the radios see in the tunnel; the server knows these.
@@ -148,6 +180,8 @@ private:
     int positions;
     size_t queriesBefore;
     int lastPrecision;
+    KDust lastSatelliteFixAt;
+    KDust firstNetworkPositionAt;
     Util::Timer finishTimer;
     Done finished;
 };

@@ -27,6 +27,6 @@ TEST_P(ApplicationLifeTest, KeepsEveryPromiseThroughALifeFromASeed) {
     EXPECT_GT(server.requestCount(), 0u);
 }
 
-INSTANTIATE_TEST_SUITE_P(Seeds, ApplicationLifeTest, ::testing::Values(1u, 2u, 3u, 4u, 5u, 6u));
+INSTANTIATE_TEST_SUITE_P(Seeds, ApplicationLifeTest, ::testing::Range<std::uint64_t>(1, 9));
 
 }  // namespace

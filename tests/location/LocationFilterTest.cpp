@@ -69,9 +69,9 @@ TEST_F(LocationFilterTest, JumpOf83MetresOrMoreRestartsTheSmoothing) {
     for (float jump : {80.0f, 100.0f}) {
         Location::LocationFilterAverage chain;
         for (int i = 0; i < 4; ++i) {
-            chain.filter(fix(12.0f * i, 0, i + 1, 12.0f, 0.0f, 10.0f));
+            chain.filter(fix(12.0f * i, 0, i + 1));
         }
-        const Fix far = fix(36.0f + jump, 0, 5, 12.0f, 0.0f, 10.0f);
+        const Fix far = fix(36.0f + jump, 0, 5);
         const Fix out = chain.filter(far);
         if (jump >= 83.0f) {
             // Nothing of the old track is averaged in.
@@ -80,6 +80,25 @@ TEST_F(LocationFilterTest, JumpOf83MetresOrMoreRestartsTheSmoothing) {
             EXPECT_GT(metresBetween(far, out), 20.0f) << jump;
         }
     }
+}
+
+// The fixes report 12 m/s: a 150 m leap in a second is an outlier, dropped,
+// unless the next fix lands near it too.
+TEST_F(LocationFilterTest, JumpItsReportedSpeedCannotExplainWaitsForTheNextFix) {
+    Location::LocationFilterAverage chain;
+    for (int i = 0; i < 4; ++i) {
+        chain.filter(fix(12.0f * i, 0, i + 1, 12.0f, 0.0f, 10.0f));
+    }
+    EXPECT_LT(chain.filter(fix(36.0f, 150.0f, 5, 12.0f, 0.0f, 10.0f)).accuracy, 0.0f);
+    const Fix backOnTrack = fix(60.0f, 0, 6, 12.0f, 0.0f, 10.0f);
+    EXPECT_LT(metresBetween(backOnTrack, chain.filter(backOnTrack)), 1.5f);
+
+    // The receiver really is elsewhere: the second fix there confirms it.
+    EXPECT_LT(chain.filter(fix(200.0f, 0, 7, 12.0f, 0.0f, 10.0f)).accuracy, 0.0f);
+    const Fix confirmed = fix(212.0f, 0, 8, 12.0f, 0.0f, 10.0f);
+    const Fix out = chain.filter(confirmed);
+    EXPECT_GE(out.accuracy, 0.0f);
+    EXPECT_LT(metresBetween(confirmed, out), 0.5f);
 }
 
 // A receiver driving a straight road without noise: the smoothed position

@@ -79,25 +79,27 @@ void degreesPerMetre(float latitude, float& latitudeDegrees, float& longitudeDeg
     longitudeDegrees = degreesPerRadian / (primeVertical * kdCosf(radians));
 }
 
-Location withBelievableMotion(const Location& previous, const Location& fix) {
+bool motionExplains(const Location& previous, const Location& fix) {
     const float seconds = secondsBetween(previous, fix);
     if (!hasSpeed(fix) || seconds <= 0.0f) {
-        return fix;
+        return true;
     }
     const float moved =
         CoordConversion::getDistance(previous.latitude, previous.longitude, fix.latitude, fix.longitude);
     const float unexplained = kdFabsf(fix.speed * seconds - moved);
     const float tolerance = previous.accuracy + fix.accuracy + kSpeedSlack * seconds;
-    if (!(unexplained > tolerance)) {
+    return !(unexplained > tolerance);
+}
+
+Location withBelievableMotion(const Location& previous, const Location& fix) {
+    if (motionExplains(previous, fix)) {
         return fix;
     }
     Location believed = fix;
-    believed.speed = moved / seconds;
-    const float dx = static_cast<float>(fix.x) - static_cast<float>(previous.x);
-    const float dy = static_cast<float>(fix.y) - static_cast<float>(previous.y);
-    believed.bearing = dx != 0.0f || dy != 0.0f ? BearingMath::bearingOf(dx, dy) : -1.0f;
-    CoordConversion::vMtovXY(believed.latitude, believed.speed, believed.speedXY);
-    believed.bearingXY = believed.bearing;
+    believed.speed = previous.speed;
+    believed.bearing = previous.bearing;
+    believed.speedXY = previous.speedXY;
+    believed.bearingXY = previous.bearingXY;
     return believed;
 }
 

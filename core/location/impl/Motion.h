@@ -27,11 +27,15 @@ bool isMoving(const Location& fix);
 void degreesPerMetre(float latitude, float& latitudeDegrees, float& longitudeDegrees);
 
 // The fix as far as its reported motion can be believed: when the speed it
-// reports cannot be reconciled with how far it moved since `previous` (a
-// receiver's speed glitch), the displacement is the better witness, and the
-// fix comes back with speed and bearing taken from it. Fixes without a speed,
-// or received at the same time as `previous`, come back unchanged.
+// reports cannot be reconciled with how far it moved since `previous`, either
+// the speed is a glitch or the position is an outlier, and in both cases the
+// motion `previous` reported is the better guess: the fix comes back with
+// previous's speed and bearing. Fixes without a speed, or received at the same
+// time as `previous`, come back unchanged.
 Location withBelievableMotion(const Location& previous, const Location& fix);
+// Whether the speed the fix reports can explain how far it moved since
+// `previous`; true when there is nothing to compare (no speed, no time).
+bool motionExplains(const Location& previous, const Location& fix);
 
 // Latitude brought back within +-90: carrying or smoothing a position near a
 // pole can take it past the pole.

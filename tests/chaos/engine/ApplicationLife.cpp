@@ -8,6 +8,7 @@
 #include <chrono>
 #include <cstdio>
 #include <cstdlib>
+#include <exception>
 #include <filesystem>
 
 #include "ChaosApp.h"
@@ -16,6 +17,7 @@
 #include "network/NetworkManager.h"
 #include "network/impl/NetworkManagerImpl.h"
 #include "redraw/ViewRedrawManager.h"
+#include "startup/StartupController.h"
 #include "startup/StartupData.h"
 #include "statistics/wifipool/NetworkCollector.h"
 #include "util/SingletonStorage.h"
@@ -25,7 +27,7 @@ namespace {
 const int kPositioningSlots = 3;
 const int kIdlePumps = 5;
 const std::size_t kRecentLogLines = 40;
-const int kDrainRounds = 600;
+const int kDrainRounds = 300;
 const KDust kMillisecond = 1000000ull;
 const KDust kSecond = 1000 * kMillisecond;
 const std::chrono::milliseconds kLongestRealWait(30000);
@@ -86,6 +88,7 @@ const ApplicationLife::Step ApplicationLife::kSteps[] = {
     {"switch server answer", &ApplicationLife::switchServerAnswer},
     {"wait for answers", &ApplicationLife::waitForAnswers},
     {"hide a view not shown", &ApplicationLife::hideViewNotShown},
+    {"fetch startup", &ApplicationLife::fetchStartup},
     {"advance time", &ApplicationLife::advanceTime},
 };
 const int ApplicationLife::kStepCount = sizeof(kSteps) / sizeof(kSteps[0]);
@@ -127,14 +130,29 @@ bool ApplicationLife::live(ByteScript& script, int maxSteps) {
         if (echoLog) {
             std::fprintf(stderr, "[step %d] %s\n", steps, step.name);
         }
+        playStep(step, script);
+    }
+    report.enterStep(steps + 1, "drain");
+    try {
+        drain();
+    } catch (const std::exception& exception) {
+        report.breach(std::string("exception escaped: ") + exception.what());
+    }
+    report.enterStep(steps + 1, "shut down");
+    shutDown();
+    return report.holds();
+}
+
+void ApplicationLife::playStep(const Step& step, ByteScript& script) {
+    // The library promises no exceptions; one that escapes is a finding like any other.
+    try {
         (this->*step.play)(script);
         kdPumpEvents();
-        hiddenThisStep.clear();
-        checkInvariants();
+    } catch (const std::exception& exception) {
+        report.breach(std::string("exception escaped: ") + exception.what());
     }
-    report.enterStep(steps + 1, "drain and shut down");
-    drainAndShutDown();
-    return report.holds();
+    hiddenThisStep.clear();
+    checkInvariants();
 }
 
 std::string ApplicationLife::failure() const {
@@ -172,7 +190,6 @@ void ApplicationLife::startApplication() {
     }
     app->setPauseHook([this](bool paused) { onAppPauseChanged(paused); });
     Startup::StartupData* startup = Startup::StartupData::getInstance();
-    startup->setHost(Startup::StartupData::HOST_STARTUP, server.host(ChaosServer::Ok));
     startup->uuid = "chaos-client";
     // The startup cycle has its own tests; here the answer is taken as received.
     startup->startupReady = true;
@@ -265,8 +282,9 @@ void ApplicationLife::settle() {
 
 // --- The end of a life ---------------------------------------------------------------------------
 
-void ApplicationLife::drainAndShutDown() {
+void ApplicationLife::drain() {
     checkInvariants();
+    finishHeldTasks();
     ChaosApp* app = ChaosApp::running();
     for (std::unique_ptr<ChaosView>& view : views) {
         if (view && app != nullptr) {
@@ -283,9 +301,6 @@ void ApplicationLife::drainAndShutDown() {
         watching = false;
     }
     collector.reset();
-    setAnswer(ChaosServer::Ok);
-    pal::setReachability(1);
-    Network::NetworkManager::getInstance()->changeOfflineModeStatus(Network::NetworkManager::OfflineModeOff);
     // Paused, the location manager's providers stop asking.
     if (!appPaused) {
         pal::postAppPaused();
@@ -305,6 +320,38 @@ void ApplicationLife::drainAndShutDown() {
                       std::to_string(kDrainRounds) + " s");
     }
     checkInvariants();
+}
+
+// With the network back, the server answering and the application running,
+// every task its owner still holds must come to its final callback: a retry
+// lost while the application was in the background shows here.
+void ApplicationLife::finishHeldTasks() {
+    setAnswer(ChaosServer::Ok);
+    if (appPaused) {
+        pal::postAppResumed();
+        kdPumpEvents();
+    }
+    reachability = 1;
+    pal::setReachability(reachability);
+    taskPool.readyAll();
+    // Held-back tasks are looked at again when offline mode ends.
+    Network::NetworkManager* manager = Network::NetworkManager::getInstance();
+    manager->changeOfflineModeStatus(Network::NetworkManager::OfflineModeOn);
+    manager->changeOfflineModeStatus(Network::NetworkManager::OfflineModeOff);
+    for (int round = 0; round < kDrainRounds && report.holds(); ++round) {
+        settle();
+        if (taskPool.unfinishedCount() == 0) {
+            return;
+        }
+        pal::advanceTime(kSecond);
+    }
+    if (taskPool.unfinishedCount() != 0) {
+        report.breach(std::to_string(taskPool.unfinishedCount()) + " held tasks never finished within " +
+                      std::to_string(kDrainRounds) + " s with the network and the server back");
+    }
+}
+
+void ApplicationLife::shutDown() {
     pal::shutdown();
     checkAssertions();
     checkLeftovers();
@@ -603,6 +650,7 @@ void ApplicationLife::setAnswer(ChaosServer::Answer value) {
     const std::string host = server.host(answer);
     Startup::StartupData* startup = Startup::StartupData::getInstance();
     startup->setHost(Startup::StartupData::HOST_DEFAULT, host);
+    startup->setHost(Startup::StartupData::HOST_STARTUP, host);
     startup->setHost(Startup::StartupData::HOST_CELLID, host);
     taskPool.setHost(host);
     if (collector) {
@@ -625,5 +673,20 @@ void ApplicationLife::hideViewNotShown(ByteScript&) {
     if (!expectedAssertion.empty()) {
         report.breach("hiding a view that is not shown did not assert");
         expectedAssertion.clear();
+    }
+}
+
+// The first call makes the controller, which fetches at once and on every
+// resume; later calls start a new cycle over a running one.
+void ApplicationLife::fetchStartup(ByteScript&) {
+    if (!libraryTasksAllowed()) {
+        return;
+    }
+    // Its listeners ask the location manager for the last position.
+    locationManagerMade = true;
+    if (Startup::StartupController::getExistingInstance() == nullptr) {
+        Startup::StartupController::getInstance();
+    } else {
+        Startup::StartupController::getInstance()->fetchStartup();
     }
 }

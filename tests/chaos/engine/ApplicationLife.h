@@ -25,7 +25,7 @@ class NetworkCollector;
 // plays it: pause and resume, views shown and hidden (also from inside their
 // redraw callbacks), reachability and offline mode, network tasks, positioning
 // requests, the location manager, satellite fixes, the statistics collector,
-// server answers, re-entries from callbacks and time. After every step it
+// the startup controller, server answers, re-entries from callbacks and time. After every step it
 // checks that nothing asserted unless the step misused the library on
 // purpose, that no task or request was heard from after its owner let it go,
 // and that live tasks and buffered bytes stay bounded. At the end it takes
@@ -74,9 +74,12 @@ private:
     static const Step kSteps[];
     static const int kStepCount;
 
+    void playStep(const Step& step, ByteScript& script);
     void boot();
     void startApplication();
-    void drainAndShutDown();
+    void drain();
+    void finishHeldTasks();
+    void shutDown();
     void checkInvariants();
     void checkAssertions();
     void checkLeftovers();
@@ -114,6 +117,7 @@ private:
     void switchServerAnswer(ByteScript& script);
     void waitForAnswers(ByteScript& script);
     void hideViewNotShown(ByteScript& script);
+    void fetchStartup(ByteScript& script);
 
     // Hides a shown view now and deletes it at the end of the step.
     void hideNow(ChaosView& view);

@@ -7,8 +7,9 @@
 // The loopback servers the scenario's application talks to: one real HTTP
 // server whose first path segment chooses how it answers, and a port where
 // nobody listens. The same paths serve the scenario's own tasks ("task"),
-// network positioning ("cellid_location/") and statistics uploads
-// ("wifipool/2.x/"), so a host switched to another answer changes them all.
+// network positioning ("cellid_location/"), statistics uploads
+// ("wifipool/2.x/") and the startup document ("startup"), so a host switched
+// to another answer changes them all.
 class ChaosServer {
 public:
     enum Answer {
@@ -33,7 +34,7 @@ private:
     ChaosServer(const ChaosServer&) = delete;
     ChaosServer& operator=(const ChaosServer&) = delete;
 
-    void script(Answer answer, const TestHttpServer::Reply& reply);
+    void script(Answer answer, const std::string& path, const TestHttpServer::Reply& reply);
 
     TestHttpServer server;
     int refusingPort;

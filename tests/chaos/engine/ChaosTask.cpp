@@ -26,7 +26,7 @@ ChaosTask::~ChaosTask() {
 }
 
 boost::shared_ptr<Network::HttpRequest> ChaosTask::issueRequest() const {
-    return Network::HttpRequest::create(settings.url.c_str(), "GET", kRequestTimeoutMs, false);
+    return Network::HttpRequest::create(settings.url->c_str(), "GET", kRequestTimeoutMs, false);
 }
 
 void ChaosTask::onResponseRecieved(boost::shared_ptr<Network::HttpResponse>) {
@@ -52,6 +52,9 @@ void ChaosTask::onFinished(int code) {
         return;
     }
     ++finals;
+    if (finalHook) {
+        finalHook();
+    }
     body.clear();
     body.shrink_to_fit();
     reenterIf(ReleaseOnFinish);

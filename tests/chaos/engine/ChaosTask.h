@@ -31,7 +31,8 @@ public:
 
     struct Settings {
         int priority = 1;
-        std::string url;
+        // Read at each attempt, as applications build a URL from the host known at that time.
+        boost::shared_ptr<const std::string> url;
         bool byParts = false;
         bool ready = true;
         Reentry reentry = NoReentry;
@@ -43,6 +44,9 @@ public:
     // Tasks constructed and not yet destroyed, across all owners.
     static int liveCount() { return live; }
 
+    // Called at the final callback before anything else, as a task run by a
+    // NetworkTaskHolder tells its holder.
+    void setFinalHook(std::function<void()> hook) { finalHook = hook; }
     // From now on the manager must not call this task any more.
     void markCancelled() { cancelled = true; }
     void setReady(bool value) { ready = value; }
@@ -68,6 +72,7 @@ private:
 
     Settings settings;
     OwnerHook ownerHook;
+    std::function<void()> finalHook;
     InvariantReport& report;
     bool ready;
     bool cancelled;

@@ -23,10 +23,15 @@ Network::NetworkManager* manager() {
 
 }  // namespace
 
-TaskPool::TaskPool(InvariantReport& report) : report(report), slots(kSlots) {}
+TaskPool::TaskPool(InvariantReport& report)
+    : report(report), url(boost::make_shared<std::string>()), slots(kSlots), holders(kSlots) {}
 
 TaskPool::~TaskPool() {
     releaseAll();
+}
+
+void TaskPool::setHost(const std::string& host) {
+    *url = host + ChaosServer::kTaskPath;
 }
 
 void TaskPool::submit(ByteScript& script) {
@@ -36,18 +41,24 @@ void TaskPool::submit(ByteScript& script) {
     settings.byParts = script.chance(2);
     settings.ready = !script.chance(6);
     settings.reentry = static_cast<ChaosTask::Reentry>(script.pick(ChaosTask::ReentryCount));
-    settings.url = host + ChaosServer::kTaskPath;
+    settings.url = url;
     const int policy = script.pick(PolicyCount);
+    const bool held = script.chance(3);
     if (!slots[slot]) {
-        submitInto(slot, settings, policy);
+        submitInto(slot, settings, policy, held);
     }
 }
 
-void TaskPool::submitInto(int slot, const ChaosTask::Settings& settings, int policy) {
+void TaskPool::submitInto(int slot, const ChaosTask::Settings& settings, int policy, bool held) {
     boost::shared_ptr<ChaosTask> task = boost::make_shared<ChaosTask>(
         settings, [this](ChaosTask& which, ChaosTask::Reentry reentry) { onReentry(which, reentry); },
         report);
     slots[slot] = task;
+    holders[slot].reset();
+    if (held) {
+        submitThroughHolder(slot, task, policy);
+        return;
+    }
     switch (policy) {
         case SingleAttempt:
             manager()->submit(task, boost::make_shared<Network::NetworkTaskBasicRetryPolicy>(500, 1, false));
@@ -68,15 +79,40 @@ void TaskPool::submitInto(int slot, const ChaosTask::Settings& settings, int pol
     }
 }
 
+void TaskPool::submitThroughHolder(int slot, const boost::shared_ptr<ChaosTask>& task, int policy) {
+    holders[slot].reset(new Network::NetworkTaskHolder());
+    Network::NetworkTaskHolder* holder = holders[slot].get();
+    task->setFinalHook([holder] { holder->onFinished(); });
+    switch (policy) {
+        case SingleAttempt:
+            holder->submitNoRetries(task);
+            break;
+        case EndlessRetries:
+            holder->submitInfRetries(task);
+            break;
+        case RetriesWithTimeout:
+            holder->submit(task, boost::make_shared<Network::NetworkTaskBasicRetryPolicy>(700, 4, true));
+            break;
+        default:
+            holder->submit(task);
+            break;
+    }
+}
+
 void TaskPool::cancel(ByteScript& script) {
     cancelSlot(script.pick(kSlots));
 }
 
 void TaskPool::cancelSlot(int slot) {
     boost::shared_ptr<ChaosTask> task = slots[slot];
-    if (task && !task->isCancelled()) {
-        task->markCancelled();
+    if (!task || task->isCancelled()) {
+        return;
+    }
+    task->markCancelled();
+    if (!holders[slot]) {
         manager()->cancel(task);
+    } else if (holders[slot]->isWorking()) {
+        holders[slot]->cancel();
     }
 }
 
@@ -84,6 +120,7 @@ void TaskPool::release(ByteScript& script) {
     const int slot = script.pick(kSlots);
     cancelSlot(slot);
     slots[slot].reset();
+    holders[slot].reset();
 }
 
 void TaskPool::makeReady(ByteScript& script) {
@@ -93,10 +130,29 @@ void TaskPool::makeReady(ByteScript& script) {
     }
 }
 
+void TaskPool::readyAll() {
+    for (const boost::shared_ptr<ChaosTask>& task : slots) {
+        if (task) {
+            task->setReady(true);
+        }
+    }
+}
+
+int TaskPool::unfinishedCount() const {
+    int count = 0;
+    for (const boost::shared_ptr<ChaosTask>& task : slots) {
+        if (task && !task->isCancelled() && !task->hasFinished()) {
+            ++count;
+        }
+    }
+    return count;
+}
+
 void TaskPool::releaseAll() {
     for (int slot = 0; slot < kSlots; ++slot) {
         cancelSlot(slot);
         slots[slot].reset();
+        holders[slot].reset();
     }
 }
 
@@ -127,8 +183,8 @@ void TaskPool::onReentry(ChaosTask& task, ChaosTask::Reentry reentry) {
             // A finished task frees its slot for the follow-up it asks for.
             slots[slot].reset();
             ChaosTask::Settings followUp;
-            followUp.url = host + ChaosServer::kTaskPath;
-            submitInto(slot, followUp, SingleAttempt);
+            followUp.url = url;
+            submitInto(slot, followUp, SingleAttempt, false);
             break;
         }
         default:
