@@ -9,6 +9,7 @@
 #include "network/HttpRequest.h"
 #include "network/NetworkManager.h"
 #include "network/NetworkTaskBasicRetryPolicy.h"
+#include "network/impl/NetworkManagerImpl.h"
 #include "statistics/wifipool/NetworkCollector.h"
 #include "statistics/wifipool/UploadConstants.h"
 #include "support/PalTest.h"
@@ -305,6 +306,44 @@ TEST_F(NetworkCollectorTest, MeasuresRequestsOnlyWhileStartedAndNotPaused) {
     collector->stop();
     downloadTiles(3);
     EXPECT_EQ(0, collector->getNetworkSpeedCollector()->getRecordCount());
+}
+
+// An upload that found the network offline waits for offline mode to end and
+// belongs to its collector meanwhile: stop() withdraws it, and once the
+// collector is gone nothing of it runs.
+TEST_F(NetworkCollectorTest, UploadFinishedOfflineIsWithdrawnByStopAndNeverRunsAfterTheCollectorWentAway) {
+    collector->start();
+    runSeconds(100);
+    pal::setReachability(KD_NETWORK_NOT_REACHABLE_ZVR);
+    runSeconds(21);
+    ASSERT_EQ(NetworkManager::OfflineModeOn, NetworkManager::getInstance()->getOfflineModeStatus());
+
+    collector->stop();
+    collector.reset();
+    pal::setReachability(KD_NETWORK_REACHABLE_VIA_WIFI_ZVR);
+    NetworkManager::getInstance()->changeOfflineModeStatus(NetworkManager::OfflineModeOff);
+    runSeconds(5);
+
+    EXPECT_EQ(0, static_cast<Network::NetworkManagerImpl*>(NetworkManager::getInstance())->getTaskCount());
+    EXPECT_EQ(0u, server->requestCount());
+}
+
+TEST_F(NetworkCollectorTest, UploadFinishedOfflineGoesOutOnceWhenOfflineModeEnds) {
+    collector->start();
+    runSeconds(100);
+    pal::setReachability(KD_NETWORK_NOT_REACHABLE_ZVR);
+    runSeconds(21);
+    ASSERT_EQ(NetworkManager::OfflineModeOn, NetworkManager::getInstance()->getOfflineModeStatus());
+
+    pal::setReachability(KD_NETWORK_REACHABLE_VIA_WIFI_ZVR);
+    NetworkManager::getInstance()->changeOfflineModeStatus(NetworkManager::OfflineModeOff);
+    ASSERT_TRUE(awaitUploads(1));
+    runSeconds(5);
+
+    EXPECT_EQ(1u, server->requestCount());
+    Decoded decoded = decode(server->received()[0]);
+    ASSERT_TRUE(decoded.ok);
+    EXPECT_EQ("normal normal normal disconnected", decoded.types);
 }
 
 }  // namespace
