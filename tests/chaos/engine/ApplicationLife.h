@@ -36,24 +36,11 @@ class NetworkCollector;
 // life at a time per process.
 class ApplicationLife {
 public:
-    // Re-entries that reach faults being repaired elsewhere; each is switched
-    // on once its fix has landed.
-    struct Switches {
-        // Views hidden from inside update(), redraw() and onSizeChanged().
-        bool hideViewInsideRedrawCallbacks = false;
-        // Positioning requests, the location manager and statistics uploads
-        // running while the network is unreachable, so that their tasks finish
-        // offline and are queued again.
-        bool libraryTasksFinishOffline = false;
-        // Reachability changing while the application is paused.
-        bool reachabilityChangesWhilePaused = false;
-    };
-
     // Bounds checked after every step.
     static const int kMaxLiveTasks = 64;
     static const std::size_t kMaxQueuedBytes = 256 * 1024;
 
-    ApplicationLife(ChaosServer& server, const Switches& switches);
+    explicit ApplicationLife(ChaosServer& server);
     ~ApplicationLife();
 
     // Plays the script to its end or to maxSteps. True when every promise held.
@@ -119,17 +106,13 @@ private:
     void hideViewNotShown(ByteScript& script);
     void fetchStartup(ByteScript& script);
 
-    // Hides a shown view now and deletes it at the end of the step.
-    void hideNow(ChaosView& view);
+    // Hides a shown view now and deletes it now or at the end of the step.
+    void hideNow(ChaosView& view, bool deleteNow);
     void onLocationHeard();
     void onAppPauseChanged(bool paused);
     void setAnswer(ChaosServer::Answer answer);
-    // Whether library tasks may run now without finishing offline.
-    bool libraryTasksAllowed() const;
-    bool networkMayDrop() const;
 
     ChaosServer& server;
-    Switches switches;
     InvariantReport report;
     TaskPool taskPool;
     std::vector<std::unique_ptr<PositioningSlot> > positioning;
@@ -138,7 +121,6 @@ private:
     LocationWatcher watcher;
     int watcherAction;
     bool watching;
-    bool locationManagerMade;
     std::unique_ptr<Statistics::NetworkCollector> collector;
     ChaosServer::Answer answer;
     int reachability;
