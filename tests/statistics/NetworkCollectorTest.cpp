@@ -6,7 +6,9 @@
 #include <memory>
 #include <string>
 
+#include "network/HttpRequest.h"
 #include "network/NetworkManager.h"
+#include "network/NetworkTaskBasicRetryPolicy.h"
 #include "network/impl/NetworkManagerImpl.h"
 #include "statistics/wifipool/NetworkCollector.h"
 #include "statistics/wifipool/UploadConstants.h"
@@ -32,6 +34,23 @@ std::string document(const std::string& chunks, const std::string& model = "") {
            model + "\">" + chunks + "</wifipool>";
 }
 
+// A measured download, as the map's tile requests are.
+class TileTask : public Network::NetworkTask {
+public:
+    TileTask(const std::string& url, int* finished) : url(url), finished(finished) {}
+
+    bool isReadyToPerform() const override { return true; }
+    boost::shared_ptr<Network::HttpRequest> issueRequest() const override {
+        return Network::HttpRequest::create(url.c_str(), "GET", 10000, false);
+    }
+    void onBytesReceived(const std::vector<unsigned char>&) override {}
+    void onFinished(int) override { ++*finished; }
+
+private:
+    std::string url;
+    int* finished;
+};
+
 // What the independent decoder read from one upload.
 struct Decoded {
     bool ok = false;
@@ -50,6 +69,7 @@ protected:
         TestHttpServer::Reply ok;
         ok.body = "ok";
         server->on("/wifipool/2.x/", ok);
+        server->on("/tile", ok);
         pal::scriptSignalStrength(pal::Answer::after(0), false, 0);
         pal::scriptWifiScan(pal::Answer::after(0), {{"00:11:22:33:44:55", "net", -50}});
         collector.reset(new NetworkCollector());
@@ -71,6 +91,28 @@ protected:
                 pump();
             }
         }
+    }
+
+    // Downloads tiles from the server and waits until the speed collector
+    // has heard of every request sent: the engine reports the sending before
+    // the task's end.
+    void downloadTiles(int count) {
+        int finished = 0;
+        std::vector<boost::shared_ptr<TileTask> > tasks;
+        for (int i = 0; i < count; ++i) {
+            tasks.push_back(boost::make_shared<TileTask>(server->url("/tile"), &finished));
+            NetworkManager::getInstance()->submit(
+                tasks.back(), boost::make_shared<Network::NetworkTaskBasicRetryPolicy>(1000, 1, false));
+        }
+        while (finished < count) {
+            kdWaitEvent(static_cast<KDust>(-1));
+        }
+        pump();
+    }
+
+    int chunksWithRequests(int count) const {
+        return countLogLines(
+            "WifiPoolChunk::addNetworkSpeedInfoToChunk()[requests.size(): " + std::to_string(count) + "]");
     }
 
     int chunksMade() const {
@@ -241,6 +283,29 @@ TEST_F(NetworkCollectorTest, StopKeepsFinishedChunksForTheNextStart) {
     Decoded decoded = decode(server->received()[0]);
     ASSERT_TRUE(decoded.ok);
     EXPECT_EQ("normal normal normal normal", decoded.types);
+}
+
+TEST_F(NetworkCollectorTest, MeasuresRequestsOnlyWhileStartedAndNotPaused) {
+    downloadTiles(300);
+    EXPECT_EQ(0, collector->getNetworkSpeedCollector()->getRecordCount());
+    collector->start();
+    runSeconds(30);
+    EXPECT_EQ(1, chunksWithRequests(0));
+
+    downloadTiles(3);
+    runSeconds(30);
+    EXPECT_EQ(1, chunksWithRequests(3));
+
+    collector->onPaused();
+    downloadTiles(3);
+    EXPECT_EQ(0, collector->getNetworkSpeedCollector()->getRecordCount());
+    collector->onResumed();
+    runSeconds(30);
+    EXPECT_EQ(2, chunksWithRequests(0));
+
+    collector->stop();
+    downloadTiles(3);
+    EXPECT_EQ(0, collector->getNetworkSpeedCollector()->getRecordCount());
 }
 
 // An upload that found the network offline waits for offline mode to end and

@@ -28,6 +28,7 @@ std::string text(const char* value) {
 NetworkCollector::NetworkCollector()
     : thread(kdThreadSelf()),
       started(false),
+      paused(false),
       root(boost::make_shared<WifiPoolTag>()),
       scanTimerContext{this},
       sendTimerContext{this},
@@ -39,6 +40,7 @@ NetworkCollector::NetworkCollector()
       speedCollector(NetworkSpeedCollectorImpl::create()) {
     kdInstallCallback(&NetworkCollector::onScanTimerFiredWrapper, KD_EVENT_TIMER, &scanTimerContext);
     kdInstallCallback(&NetworkCollector::onSendTimerFiredWrapper, KD_EVENT_TIMER, &sendTimerContext);
+    updateRecording();
     Network::NetworkManager::getInstance()->setNetworkSpeedCollector(
         boost::weak_ptr<Network::NetworkSpeedCollector>(speedCollector));
 }
@@ -61,6 +63,7 @@ void NetworkCollector::start() {
     manager->addNetworkReachabilityStatusCallback(reachabilityCallback());
     manager->addNetworkErrorStatusCallback(errorCallback());
     started = true;
+    updateRecording();
     startTimers();
 }
 
@@ -70,6 +73,7 @@ void NetworkCollector::stop() {
         return;
     }
     started = false;
+    updateRecording();
     cancelTimers();
     cancelAllRequests();
     Network::NetworkManager* manager = Network::NetworkManager::getInstance();
@@ -148,10 +152,14 @@ bool NetworkCollector::setTimeout(long long& timeout, int seconds, const char* n
 }
 
 void NetworkCollector::onPaused() {
+    paused = true;
+    updateRecording();
     cancelTimers();
 }
 
 void NetworkCollector::onResumed() {
+    paused = false;
+    updateRecording();
     if (started) {
         startTimers();
     }
@@ -170,6 +178,12 @@ void NetworkCollector::onScanTimerFiredWrapper(const KDEvent* event) {
 
 void NetworkCollector::onSendTimerFiredWrapper(const KDEvent* event) {
     static_cast<TimerContext*>(event->userptr)->collector->onSendTimerFired();
+}
+
+// Measurements made while no chunk can take them would only pile up, and
+// while the feature is off they are not ours to send.
+void NetworkCollector::updateRecording() {
+    speedCollector->setRecording(started && !paused);
 }
 
 void NetworkCollector::startTimers() {

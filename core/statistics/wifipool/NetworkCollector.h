@@ -52,6 +52,7 @@ public:
     boost::shared_ptr<NetworkSpeedCollectorImpl> getNetworkSpeedCollector() const { return speedCollector; }
 
     // Pause stops the timers and keeps started; resume gives them full periods.
+    // Request measurements are taken only while started and not paused.
     void onPaused();
     void onResumed();
 
@@ -71,6 +72,7 @@ private:
     NetworkCollector(const NetworkCollector&) = delete;
     NetworkCollector& operator=(const NetworkCollector&) = delete;
 
+    void updateRecording();
     void startTimers();
     void cancelTimers();
     void cancelAllRequests();
@@ -88,6 +90,7 @@ private:
 
     KDThread* thread;
     bool started;
+    bool paused;
     boost::shared_ptr<WifiPoolTag> root;
     TimerContext scanTimerContext;
     TimerContext sendTimerContext;
