@@ -66,6 +66,7 @@ private:
     void startApplication();
     void drain();
     void finishHeldTasks();
+    void endOfflineMode();
     void shutDown();
     void checkInvariants();
     void checkAssertions();
