@@ -295,8 +295,8 @@ void NetworkCollector::onSendTimerFired() {
     boost::shared_ptr<NetworkCollectorRequest> request = boost::make_shared<NetworkCollectorRequest>(this);
     request->setLang(lang.c_str());
     request->submit(builder.buildString(), body);
-    // Sent chunks are gone whatever the upload's outcome, but for an upload
-    // the network manager queues again after finding the network offline.
+    // The chunks now live in the upload alone: a failed one loses them, one
+    // that finds the network offline waits in the network manager's queue.
     root->removeChildren();
 }
 
