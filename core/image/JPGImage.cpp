@@ -3,7 +3,6 @@
 #include <KD/kd.h>
 
 #include <algorithm>
-#include <climits>
 #include <csetjmp>
 #include <cstdio>
 #include <cstring>
@@ -54,10 +53,14 @@ void initSource(j_decompress_ptr cinfo) {
 
 boolean fillInputBuffer(j_decompress_ptr cinfo) {
     zavrin_jpeg_source_mgr* source = sourceOf(cinfo);
-    long long available = source->in->available();
+    const long long available = source->in->available();
     int count =
         available >= kSourceBufferSize ? kSourceBufferSize : static_cast<int>(available > 0 ? available : 0);
-    if (count == 0) {
+    // A stream may claim more than it delivers (a damaged zip entry): only what was read counts.
+    if (count > 0) {
+        count = source->in->read(source->buffer, count);
+    }
+    if (count <= 0) {
         if (source->startOfFile) {
             ERREXIT(cinfo, JERR_INPUT_EMPTY);
         }
@@ -67,8 +70,6 @@ boolean fillInputBuffer(j_decompress_ptr cinfo) {
         source->buffer[0] = 0xFF;
         source->buffer[1] = JPEG_EOI;
         count = 2;
-    } else {
-        source->in->read(source->buffer, count);
     }
     source->base.next_input_byte = source->buffer;
     source->base.bytes_in_buffer = count;
@@ -108,12 +109,15 @@ private:
 // What the library may allocate for one image besides the pixels we hold: its
 // row buffers, and for progressive or multi-scan files the coefficients of the
 // whole image, which a header of a hundred bytes can declare by the hundred
-// megabytes. Real files of that kind carry data in proportion.
+// megabytes. Real files of that kind carry data in proportion. No allowed
+// image needs more than the coefficients of 8192 x 8192 pixels in three full
+// components, 384 MiB.
 long libraryMemoryLimit(IO::InputStream* in) {
     const long long base = 16LL << 20;
     const long long perInputByte = 64;
-    const long long inputBytes = std::max(0LL, std::min(in->available(), 1LL << 30));
-    return static_cast<long>(std::min<long long>(base + perInputByte * inputBytes, LONG_MAX));
+    const long long most = base + (384LL << 20);
+    const long long inputBytes = std::max(0LL, std::min(in->available(), most / perInputByte));
+    return static_cast<long>(std::min(base + perInputByte * inputBytes, most));
 }
 
 bool isSupportedColourLayout(j_decompress_ptr cinfo) {

@@ -108,6 +108,11 @@ bool PNGImage::prepareLayout(png_structp png, png_infop info) {
     int depth = 0;
     int colourType = 0;
     png_get_IHDR(png, info, &pngWidth, &pngHeight, &depth, &colourType, nullptr, nullptr, nullptr);
+    // Before png_read_update_info, which allocates libpng's row buffers.
+    if (pngWidth > kMaxSide || pngHeight > kMaxSide) {
+        Logger::log(Logger::Info, "PNG: %ux%u is larger than %ux%u", pngWidth, pngHeight, kMaxSide, kMaxSide);
+        return false;
+    }
     if (depth == 16) {
         png_set_strip_16(png);
     }
@@ -140,10 +145,6 @@ bool PNGImage::prepareLayout(png_structp png, png_infop info) {
             return false;
     }
     const bool palette = colourType == PNG_COLOR_TYPE_PALETTE;
-    if (pngWidth > kMaxSide || pngHeight > kMaxSide) {
-        Logger::log(Logger::Info, "PNG: %ux%u is larger than %ux%u", pngWidth, pngHeight, kMaxSide, kMaxSide);
-        return false;
-    }
     if (!allocate(pngWidth, pngHeight, bits, palette ? kPaletteEntries : 0,
                   palette ? kPaletteEntryBits : 0)) {
         return false;

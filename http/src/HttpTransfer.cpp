@@ -9,6 +9,7 @@
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
+#include <new>
 
 #include "HttpEngineCore.h"
 #include "network/HttpConnection.h"
@@ -144,6 +145,7 @@ HttpTransfer::HttpTransfer(const boost::shared_ptr<HttpRequest>& request, int id
       badAnswer(false),
       bodyBytesReceived(0),
       bodyTooLarge(false),
+      outOfMemory(false),
       sentReported(false),
       finished(false),
       deliveriesQueued(false) {
@@ -308,6 +310,11 @@ void HttpTransfer::complete(CURLcode result) {
     if (bodyTooLarge) {
         kdLogFormatMessage("HttpConnection %d: the body is larger than %lld bytes", id, maxBodySize);
         finish(HTTP_BODY_TOO_LARGE_ERROR_CODE);
+        return;
+    }
+    if (outOfMemory) {
+        kdLogFormatMessage("HttpConnection %d: no memory for the body", id);
+        finish(HTTP_GENERIC_ERROR_CODE);
         return;
     }
     if (stoppedAfterAnswer) {
@@ -534,7 +541,14 @@ size_t HttpTransfer::receiveBody(char* data, size_t length) {
         deliveriesQueued = true;
         return length;
     }
-    keepWholeBody(bytes, length);
+    // The engine thread must not end in an exception; the transfer fails instead.
+    try {
+        keepWholeBody(bytes, length);
+    } catch (const std::bad_alloc&) {
+        outOfMemory = true;
+        wholeBodyData.reset();
+        return 0;
+    }
     return length;
 }
 

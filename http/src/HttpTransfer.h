@@ -162,6 +162,7 @@ private:
     // Body bytes of the response taken so far, kept or not.
     long long bodyBytesReceived;
     bool bodyTooLarge;
+    bool outOfMemory;
     bool sentReported;
     bool finished;
     // Something was pushed to the caller since the last flush.

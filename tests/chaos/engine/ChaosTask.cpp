@@ -52,6 +52,9 @@ void ChaosTask::onFinished(int code) {
         return;
     }
     ++finals;
+    if (finalHook) {
+        finalHook();
+    }
     body.clear();
     body.shrink_to_fit();
     reenterIf(ReleaseOnFinish);

@@ -44,6 +44,9 @@ public:
     // Tasks constructed and not yet destroyed, across all owners.
     static int liveCount() { return live; }
 
+    // Called at the final callback before anything else, as a task run by a
+    // NetworkTaskHolder tells its holder.
+    void setFinalHook(std::function<void()> hook) { finalHook = hook; }
     // From now on the manager must not call this task any more.
     void markCancelled() { cancelled = true; }
     void setReady(bool value) { ready = value; }
@@ -69,6 +72,7 @@ private:
 
     Settings settings;
     OwnerHook ownerHook;
+    std::function<void()> finalHook;
     InvariantReport& report;
     bool ready;
     bool cancelled;

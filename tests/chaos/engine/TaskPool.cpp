@@ -24,7 +24,7 @@ Network::NetworkManager* manager() {
 }  // namespace
 
 TaskPool::TaskPool(InvariantReport& report)
-    : report(report), url(boost::make_shared<std::string>()), slots(kSlots) {}
+    : report(report), url(boost::make_shared<std::string>()), slots(kSlots), holders(kSlots) {}
 
 TaskPool::~TaskPool() {
     releaseAll();
@@ -43,16 +43,22 @@ void TaskPool::submit(ByteScript& script) {
     settings.reentry = static_cast<ChaosTask::Reentry>(script.pick(ChaosTask::ReentryCount));
     settings.url = url;
     const int policy = script.pick(PolicyCount);
+    const bool held = script.chance(3);
     if (!slots[slot]) {
-        submitInto(slot, settings, policy);
+        submitInto(slot, settings, policy, held);
     }
 }
 
-void TaskPool::submitInto(int slot, const ChaosTask::Settings& settings, int policy) {
+void TaskPool::submitInto(int slot, const ChaosTask::Settings& settings, int policy, bool held) {
     boost::shared_ptr<ChaosTask> task = boost::make_shared<ChaosTask>(
         settings, [this](ChaosTask& which, ChaosTask::Reentry reentry) { onReentry(which, reentry); },
         report);
     slots[slot] = task;
+    holders[slot].reset();
+    if (held) {
+        submitThroughHolder(slot, task, policy);
+        return;
+    }
     switch (policy) {
         case SingleAttempt:
             manager()->submit(task, boost::make_shared<Network::NetworkTaskBasicRetryPolicy>(500, 1, false));
@@ -73,15 +79,40 @@ void TaskPool::submitInto(int slot, const ChaosTask::Settings& settings, int pol
     }
 }
 
+void TaskPool::submitThroughHolder(int slot, const boost::shared_ptr<ChaosTask>& task, int policy) {
+    holders[slot].reset(new Network::NetworkTaskHolder());
+    Network::NetworkTaskHolder* holder = holders[slot].get();
+    task->setFinalHook([holder] { holder->onFinished(); });
+    switch (policy) {
+        case SingleAttempt:
+            holder->submitNoRetries(task);
+            break;
+        case EndlessRetries:
+            holder->submitInfRetries(task);
+            break;
+        case RetriesWithTimeout:
+            holder->submit(task, boost::make_shared<Network::NetworkTaskBasicRetryPolicy>(700, 4, true));
+            break;
+        default:
+            holder->submit(task);
+            break;
+    }
+}
+
 void TaskPool::cancel(ByteScript& script) {
     cancelSlot(script.pick(kSlots));
 }
 
 void TaskPool::cancelSlot(int slot) {
     boost::shared_ptr<ChaosTask> task = slots[slot];
-    if (task && !task->isCancelled()) {
-        task->markCancelled();
+    if (!task || task->isCancelled()) {
+        return;
+    }
+    task->markCancelled();
+    if (!holders[slot]) {
         manager()->cancel(task);
+    } else if (holders[slot]->isWorking()) {
+        holders[slot]->cancel();
     }
 }
 
@@ -89,6 +120,7 @@ void TaskPool::release(ByteScript& script) {
     const int slot = script.pick(kSlots);
     cancelSlot(slot);
     slots[slot].reset();
+    holders[slot].reset();
 }
 
 void TaskPool::makeReady(ByteScript& script) {
@@ -120,6 +152,7 @@ void TaskPool::releaseAll() {
     for (int slot = 0; slot < kSlots; ++slot) {
         cancelSlot(slot);
         slots[slot].reset();
+        holders[slot].reset();
     }
 }
 
@@ -151,7 +184,7 @@ void TaskPool::onReentry(ChaosTask& task, ChaosTask::Reentry reentry) {
             slots[slot].reset();
             ChaosTask::Settings followUp;
             followUp.url = url;
-            submitInto(slot, followUp, SingleAttempt);
+            submitInto(slot, followUp, SingleAttempt, false);
             break;
         }
         default:

@@ -1,16 +1,19 @@
 #pragma once
 
 #include <boost/shared_ptr.hpp>
+#include <memory>
 #include <string>
 #include <vector>
 
 #include "ByteScript.h"
 #include "ChaosTask.h"
 #include "InvariantReport.h"
+#include "network/NetworkTaskHolder.h"
 
 // The scenario's own network tasks, in a fixed number of slots: submitted
-// with every priority and retry policy, cancelled, released (cancelled and
-// dropped), made ready, and re-entered from their own callbacks. Main thread
+// with every priority and retry policy, directly or through a
+// NetworkTaskHolder, cancelled, released (cancelled and dropped, or the holder
+// destroyed), made ready, and re-entered from their own callbacks. Main thread
 // only.
 class TaskPool {
 public:
@@ -39,7 +42,8 @@ private:
     TaskPool(const TaskPool&) = delete;
     TaskPool& operator=(const TaskPool&) = delete;
 
-    void submitInto(int slot, const ChaosTask::Settings& settings, int policy);
+    void submitInto(int slot, const ChaosTask::Settings& settings, int policy, bool held);
+    void submitThroughHolder(int slot, const boost::shared_ptr<ChaosTask>& task, int policy);
     void cancelSlot(int slot);
     void onReentry(ChaosTask& task, ChaosTask::Reentry reentry);
     int slotOf(const ChaosTask& task) const;
@@ -48,4 +52,6 @@ private:
     // Shared with the tasks, which read it at each attempt.
     boost::shared_ptr<std::string> url;
     std::vector<boost::shared_ptr<ChaosTask> > slots;
+    // The holder of a slot's task when it was submitted through one.
+    std::vector<std::unique_ptr<Network::NetworkTaskHolder> > holders;
 };
