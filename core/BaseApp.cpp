@@ -144,12 +144,21 @@ void BaseApp::showView(BaseView* view) {
 
 void BaseApp::hideView(BaseView* view) {
     Logger::log(Logger::Info, "BaseApp::hideView 0x%X", addressForLog(view));
+    // Hidden again from its own shutdown(), a view would shut down forever.
+    const bool beingHidden =
+        std::find(viewsBeingHidden.begin(), viewsBeingHidden.end(), view) != viewsBeingHidden.end();
+    KD_ASSERT(!beingHidden && "a view is not hidden again from inside its own shutdown()");
+    if (beingHidden) {
+        return;
+    }
     std::vector<BaseView*>::iterator it = std::find(runningViews.begin(), runningViews.end(), view);
     KD_ASSERT(it != runningViews.end());
     if (it == runningViews.end()) {
         return;
     }
+    viewsBeingHidden.push_back(view);
     view->shutdown();
+    viewsBeingHidden.pop_back();
     // shutdown() may have shown or hidden other views.
     runningViews.erase(std::remove(runningViews.begin(), runningViews.end(), view), runningViews.end());
 }

@@ -52,6 +52,8 @@ private:
     static void onPalShutdown(void* userdata);
 
     std::vector<BaseView*> runningViews;
+    // Views whose shutdown() runs, innermost last.
+    std::vector<BaseView*> viewsBeingHidden;
     FileSystemMountEventDispatcher fileSystemEventDispatcher;
     boost::shared_ptr<Lifecycle::PauseResumeListenerWrapper> pauseResumeListenerWrapper;
     bool isPaused;

@@ -1,6 +1,7 @@
 #include "BaseView.h"
 
 #include <boost/make_shared.hpp>
+#include <boost/weak_ptr.hpp>
 #include <cstring>
 
 #include "lifecycle/PauseResumeHandler.h"
@@ -93,7 +94,8 @@ BaseView::BaseView()
       pointerX(0),
       pointerY(0),
       selectPressed(false),
-      redrawManager(nullptr) {}
+      redrawManager(nullptr),
+      life(boost::make_shared<bool>(true)) {}
 
 BaseView::~BaseView() {
     // The callbacks stay installed across shutdown(); a deleted view must not
@@ -191,12 +193,15 @@ bool BaseView::onViewResumed() {
         return false;
     }
     kdGFXSetRedrawHandler(this, &BaseView::handleRedraw);
+    const boost::weak_ptr<bool> alive = life;
     updateSize();
-    Redraw::ViewRedrawManager* manager = getRedrawManager();
-    if (manager != nullptr) {
-        manager->scheduleUpdate();
-        manager->scheduleRedraw();
+    // onSizeChanged() may have hidden this view, which stays paused then, or
+    // deleted it.
+    if (alive.expired() || redrawManager == nullptr) {
+        return false;
     }
+    redrawManager->scheduleUpdate();
+    redrawManager->scheduleRedraw();
     isViewPaused = false;
     return true;
 }
@@ -208,8 +213,11 @@ void BaseView::resumeIfViewRunning() {
     }
     // The order of the event's fan-out: the view registered before its
     // redraw manager.
+    const boost::weak_ptr<bool> alive = life;
     onViewResumed();
-    redrawManager->onViewResumed();
+    if (!alive.expired() && redrawManager != nullptr) {
+        redrawManager->onViewResumed();
+    }
 }
 
 void BaseView::onKey(int key, int, int) {
@@ -240,6 +248,7 @@ void BaseView::handleEvent(const KDEvent* event) {
         return;
     }
     KD_ASSERT(isMainEventType(event->type));
+    const boost::weak_ptr<bool> alive = life;
     switch (event->type) {
         case KD_EVENT_VIEW_ACTIVITY_ZVR:
             onViewEvent104();
@@ -255,6 +264,9 @@ void BaseView::handleEvent(const KDEvent* event) {
             break;
         default:
             return;
+    }
+    if (alive.expired()) {
+        return;
     }
     if (!isViewPaused && redrawManager != nullptr) {
         redrawManager->onUserActivity();
@@ -296,22 +308,28 @@ void BaseView::handlePointer(const KDEventInputPointer& pointer) {
     if (pointer.index != KD_INPUT_POINTER_SELECT) {
         return;
     }
-    bool pressed = pointer.select > 0;
-    if (pressed && !selectPressed) {
+    const bool pressed = pointer.select > 0;
+    const bool wasPressed = selectPressed;
+    // Updated before the call, which may delete the view.
+    selectPressed = pressed;
+    if (pressed && !wasPressed) {
         pointerDown = 1;
         onPointerPressed(pointerX, pointerY);
-    } else if (!pressed && selectPressed) {
+    } else if (!pressed && wasPressed) {
         pointerDown = 0;
         onPointerReleased(pointerX, pointerY);
     }
-    selectPressed = pressed;
 }
 
 void BaseView::handleKey(const KDEventInput& key) {
     if (key.value.i == 0) {
         return;
     }
+    const boost::weak_ptr<bool> alive = life;
     onKey(key.index, pointerX, pointerY);
+    if (alive.expired()) {
+        return;
+    }
     switch (key.index) {
         case kKeyFlingLeft:
             emulateFling(pointerX, pointerY, -kEmulatedFlingSpeed, 0);
@@ -341,25 +359,30 @@ void BaseView::handleGesture(const KDEventData& data) {
 }
 
 void BaseView::emulateFling(int x, int y, int dx, int dy) {
-    KDEventData data = gestureData(kGestureFling, dx, dy);
-    onPointerPressed(x, y);
-    postGesture(data);
-    onPointerReleased(x, y);
+    pressGestureRelease(gestureData(kGestureFling, dx, dy), x, y);
 }
 
 void BaseView::emulateRotation(int x, int y, float angle) {
     KDEventData data = gestureData(kGestureRotation, x, y);
     writeFloat(data, 8, angle);
-    onPointerPressed(x, y);
-    postGesture(data);
-    onPointerReleased(x, y);
+    pressGestureRelease(data, x, y);
 }
 
 void BaseView::emulateTap() {
-    KDEventData data = gestureData(kGestureTap, pointerX, pointerY);
-    onPointerPressed(pointerX, pointerY);
+    pressGestureRelease(gestureData(kGestureTap, pointerX, pointerY), pointerX, pointerY);
+}
+
+void BaseView::pressGestureRelease(const KDEventData& data, int x, int y) {
+    const boost::weak_ptr<bool> alive = life;
+    onPointerPressed(x, y);
+    if (alive.expired()) {
+        return;
+    }
     postGesture(data);
-    onPointerReleased(pointerX, pointerY);
+    if (alive.expired()) {
+        return;
+    }
+    onPointerReleased(x, y);
 }
 
 void BaseView::postGesture(const KDEventData& data) {

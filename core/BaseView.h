@@ -20,6 +20,10 @@ class ResourceManager;
 // operations, follows the size of the main graphics context, and owns the
 // redraw manager and the render resource manager while it is shown. The view
 // is its own platform view proxy. Main thread only.
+//
+// The application may hide, show, and also delete a view from inside any of
+// the view's callbacks (input, view events, size, update, redraw, draw);
+// the view touches nothing of itself afterwards.
 class BaseView : public Redraw::ViewRedrawManagerDelegate,
                  public Lifecycle::PauseResumeListener,
                  public KDViewProxyZVR {
@@ -104,6 +108,7 @@ private:
     void handleKey(const KDEventInput& key);
     void handleGesture(const KDEventData& data);
     void emulateTap();
+    void pressGestureRelease(const KDEventData& data, int x, int y);
     // Posts gesture event 100 and dispatches it at once.
     void postGesture(const KDEventData& data);
 
@@ -117,4 +122,7 @@ private:
     bool selectPressed;
     boost::shared_ptr<Lifecycle::PauseResumeListenerWrapper> pauseResumeListenerWrapper;
     Redraw::ViewRedrawManager* redrawManager;
+    // Expires with the view: code that calls out and then goes on watches it
+    // through a weak reference.
+    boost::shared_ptr<bool> life;
 };

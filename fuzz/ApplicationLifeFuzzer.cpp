@@ -20,7 +20,7 @@ const int kMaxSteps = 400;
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
     static ChaosServer* server = new ChaosServer();
-    ApplicationLife life(*server, ApplicationLife::Switches());
+    ApplicationLife life(*server);
     ByteScript script(data, size);
     if (!life.live(script, kMaxSteps)) {
         std::fprintf(stderr, "mapcore chaos: broken promise: %s\n", life.failure().c_str());

@@ -53,10 +53,14 @@ void initSource(j_decompress_ptr cinfo) {
 
 boolean fillInputBuffer(j_decompress_ptr cinfo) {
     zavrin_jpeg_source_mgr* source = sourceOf(cinfo);
-    long long available = source->in->available();
+    const long long available = source->in->available();
     int count =
         available >= kSourceBufferSize ? kSourceBufferSize : static_cast<int>(available > 0 ? available : 0);
-    if (count == 0) {
+    // A stream may claim more than it delivers (a damaged zip entry): only what was read counts.
+    if (count > 0) {
+        count = source->in->read(source->buffer, count);
+    }
+    if (count <= 0) {
         if (source->startOfFile) {
             ERREXIT(cinfo, JERR_INPUT_EMPTY);
         }
@@ -66,8 +70,6 @@ boolean fillInputBuffer(j_decompress_ptr cinfo) {
         source->buffer[0] = 0xFF;
         source->buffer[1] = JPEG_EOI;
         count = 2;
-    } else {
-        source->in->read(source->buffer, count);
     }
     source->base.next_input_byte = source->buffer;
     source->base.bytes_in_buffer = count;

@@ -40,6 +40,11 @@ public:
     virtual void submit(boost::shared_ptr<NetworkTask> task) = 0;
     virtual void submit(boost::shared_ptr<NetworkTask> task,
                         boost::shared_ptr<NetworkTaskRetryPolicy> retryPolicy) = 0;
+    // A task that finishes with OFFLINE_ERROR_CODE is queued again and runs
+    // (and reports) once more after offline mode ends: its owner keeps it to
+    // hear that run, or lets it go with cancel(). cancel() withdraws the task
+    // in any state, also from inside its own onFinished and after it
+    // completed; nothing of it runs or reports afterwards.
     virtual void cancel(boost::shared_ptr<NetworkTask> task) = 0;
 
     virtual OfflineModeStatus getOfflineModeStatus() const = 0;

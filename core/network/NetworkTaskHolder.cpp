@@ -60,9 +60,15 @@ void NetworkTaskHolder::cancel() {
     NetworkManager::getInstance()->cancel(cancelled);
 }
 
+// The task may have finished offline and be queued to run again; a holder
+// that lets it go must withdraw it, or that run would reach a gone owner.
 void NetworkTaskHolder::onFinished() {
     KD_ASSERT(task != __null);
-    task.reset();
+    boost::shared_ptr<NetworkTask> finished;
+    finished.swap(task);
+    if (finished) {
+        NetworkManager::getInstance()->cancel(finished);
+    }
 }
 
 }  // namespace Network

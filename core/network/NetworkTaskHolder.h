@@ -9,7 +9,9 @@ namespace Network {
 
 // Runs one task at a time through the network manager and ties it to the
 // holder's lifetime: a task still held is cancelled when the holder goes.
-// The held task calls onFinished() of the holder from its own onFinished().
+// The held task calls onFinished() of the holder from its own onFinished()
+// when its owner is done with it; a task that finished offline and is not
+// let go stays held and runs again after offline mode.
 // The task's caller thread only.
 class NetworkTaskHolder {
 public:

@@ -4,12 +4,15 @@
 
 namespace Redraw {
 
-UpdateGenerator::UpdateGenerator(ViewRedrawManager& manager) : manager(manager) {
+UpdateGenerator::UpdateGenerator(ViewRedrawManager& manager)
+    : manager(manager), managerLifetime(manager.getLifetime()) {
     manager.increaseUpdateGeneratorCount();
 }
 
 UpdateGenerator::~UpdateGenerator() {
-    manager.decreaseUpdateGeneratorCount();
+    if (!managerLifetime.expired()) {
+        manager.decreaseUpdateGeneratorCount();
+    }
 }
 
 }  // namespace Redraw

@@ -58,7 +58,9 @@ ViewRedrawManager::ViewRedrawManager(ViewRedrawManagerDelegate& delegate)
       updateGeneratorCount(0),
       updateScheduled(false),
       redrawScheduled(false),
-      isViewPaused(true) {
+      isViewPaused(true),
+      destroyedDuringTick(nullptr),
+      lifetime(boost::make_shared<bool>(true)) {
     Lifecycle::PauseResumeHandler* handler = Lifecycle::PauseResumeHandler::getInstance();
     KD_ASSERT(handler != nullptr);
     if (handler != nullptr) {
@@ -67,6 +69,9 @@ ViewRedrawManager::ViewRedrawManager(ViewRedrawManagerDelegate& delegate)
 }
 
 ViewRedrawManager::~ViewRedrawManager() {
+    if (destroyedDuringTick != nullptr) {
+        *destroyedDuringTick = true;
+    }
     Lifecycle::PauseResumeHandler* handler = Lifecycle::PauseResumeHandler::getInstance();
     if (handler != nullptr) {
         handler->removeListener(pauseResumeListenerWrapper.get());
@@ -153,6 +158,10 @@ KDint64 ViewRedrawManager::getMinUpdatePeriod() const {
     return kIdleViewUpdatePeriodNs;
 }
 
+// The delegate may hide the view and so destroy this manager from inside
+// update() or redraw(): after each call nothing of this is touched when the
+// destructor has run meanwhile. A delegate that pumps events may run a tick
+// inside this one; both learn of the destruction.
 void ViewRedrawManager::tick() {
     KDint64 time = now();
     KDint64 delta = time - lastTickTime;
@@ -162,9 +171,16 @@ void ViewRedrawManager::tick() {
     }
     lastTickTime = time;
     rollCounterWindow(time);
+    bool destroyed = false;
+    bool* const outerTick = destroyedDuringTick;
+    destroyedDuringTick = &destroyed;
     if (updateScheduled || updateGeneratorCount > 0) {
         updateScheduled = false;
         delegate.update(clampedElapsedMs(delta));
+        if (destroyed) {
+            reportDestroyed(outerTick);
+            return;
+        }
         ++updateCounter;
     } else {
         // Nothing left to animate: the next schedule call starts it again.
@@ -173,7 +189,18 @@ void ViewRedrawManager::tick() {
     if (redrawScheduled) {
         redrawScheduled = false;
         delegate.redraw();
+        if (destroyed) {
+            reportDestroyed(outerTick);
+            return;
+        }
         ++redrawCounter;
+    }
+    destroyedDuringTick = outerTick;
+}
+
+void ViewRedrawManager::reportDestroyed(bool* outerTick) {
+    if (outerTick != nullptr) {
+        *outerTick = true;
     }
 }
 

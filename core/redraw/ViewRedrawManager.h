@@ -3,6 +3,7 @@
 #include <KD/kd.h>
 
 #include <boost/shared_ptr.hpp>
+#include <boost/weak_ptr.hpp>
 
 #include "lifecycle/PauseResumeListener.h"
 #include "lifecycle/PauseResumeListenerWrapper.h"
@@ -39,6 +40,9 @@ public:
     // Minimum time between two updates, in nanoseconds.
     KDint64 getMinUpdatePeriod() const;
     bool getIsTimerStarted() const { return timer.isStarted(); }
+    // Expires when the manager is destroyed; lets an UpdateGenerator outlive
+    // it (the view was hidden while an animation ran).
+    boost::weak_ptr<void> getLifetime() const { return lifetime; }
 
     void startTimerIfNot();
     // The timer's callback.
@@ -53,6 +57,7 @@ private:
 
     static KDint64 now();
     void rollCounterWindow(KDint64 time);
+    static void reportDestroyed(bool* outerTick);
 
     ViewRedrawManagerDelegate& delegate;
     boost::shared_ptr<Lifecycle::PauseResumeListenerWrapper> pauseResumeListenerWrapper;
@@ -69,6 +74,10 @@ private:
     bool updateScheduled;
     bool redrawScheduled;
     bool isViewPaused;
+    // Set by the destructor when a delegate call destroyed this manager (the
+    // application hid the view from update or redraw); null outside tick().
+    bool* destroyedDuringTick;
+    boost::shared_ptr<void> lifetime;
 };
 
 }  // namespace Redraw

@@ -27,11 +27,11 @@ void LbsNetworkRequestInternal::submit() {
     Network::NetworkManager::getInstance()->submit(shared_from_this());
 }
 
+// Also after the task finished: one that finished offline is queued to run
+// again, and that run would reach an owner that has let it go.
 void LbsNetworkRequestInternal::cancel() {
-    if (isFinished) {
-        return;
-    }
     isFinished = true;
+    owner = nullptr;
     Network::NetworkManager::getInstance()->cancel(shared_from_this());
 }
 
@@ -40,6 +40,10 @@ bool LbsNetworkRequestInternal::isReadyToPerform() const {
 }
 
 boost::shared_ptr<Network::HttpRequest> LbsNetworkRequestInternal::issueRequest() const {
+    KD_ASSERT(owner != nullptr && "a cancelled positioning request is not run again");
+    if (owner == nullptr) {
+        return boost::shared_ptr<Network::HttpRequest>();
+    }
     const Startup::StartupData* startupData = Startup::StartupData::getInstance();
     // The uuid comes from a server: escaped, it cannot add parameters.
     const std::string url = startupData->getHost(Startup::StartupData::HOST_CELLID) + kLocationPath +
@@ -63,7 +67,7 @@ void LbsNetworkRequestInternal::onBytesReceived(const std::vector<unsigned char>
 
 void LbsNetworkRequestInternal::onFinished(int code) {
     KD_ASSERT(isFinished == false);
-    if (isFinished) {
+    if (isFinished || owner == nullptr) {
         return;
     }
     isFinished = true;

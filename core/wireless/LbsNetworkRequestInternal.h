@@ -16,7 +16,8 @@ class LbsNetworkRequest;
 class LbsNetworkRequestInternal : public Network::NetworkTask,
                                   public boost::enable_shared_from_this<LbsNetworkRequestInternal> {
 public:
-    // owner is not owned; it cancels this task before it goes away.
+    // owner is not owned; it cancels this task before it lets it go, and the
+    // task forgets it then.
     explicit LbsNetworkRequestInternal(LbsNetworkRequest* owner);
 
     void submit();

@@ -74,7 +74,14 @@ const Hook* nextHook(bool starting) {
 
 namespace pal::detail {
 
-KDThread* mainThread() { return g_mainThread.load(); }
+KDThread* mainThread() {
+    return g_mainThread.load();
+}
+
+void forgetMainThread(KDThread* ending) {
+    KDThread* expected = ending;
+    g_mainThread.compare_exchange_strong(expected, nullptr);
+}
 
 }  // namespace pal::detail
 
@@ -108,7 +115,9 @@ void shutdown() {
         }
     }
     // Events left for a finished run must not reach the next one.
-    detail::discardAllEvents(kdThreadSelf());
+    if (KDThread* self = kdThreadSelf()) {
+        detail::discardAllEvents(self);
+    }
 }
 
 int run() {
@@ -121,15 +130,20 @@ int run() {
     return g_exitStatus.load();
 }
 
-bool exitRequested() { return g_exitRequested.load(); }
+bool exitRequested() {
+    return g_exitRequested.load();
+}
 
-int exitStatus() { return g_exitStatus.load(); }
+int exitStatus() {
+    return g_exitStatus.load();
+}
 
 }  // namespace pal
 
 extern "C" {
 
-KDint kdAddPalCallbacksZVR(KDPalInitFuncZVR* onInit, KDPalShutdownFuncZVR* onShutdown, KDint order, void* userdata) {
+KDint kdAddPalCallbacksZVR(KDPalInitFuncZVR* onInit, KDPalShutdownFuncZVR* onShutdown, KDint order,
+                           void* userdata) {
     Hooks& h = hooks();
     std::lock_guard<std::mutex> lock(h.mutex);
     for (const Hook& hook : h.hooks) {

@@ -6,7 +6,6 @@
 // callback may post, pump again (nested) or install callbacks freely.
 
 #include <KD/kdext.h>
-
 #include <pal/Simulation.h>
 
 #include <chrono>
@@ -96,8 +95,18 @@ std::vector<QueuedEvent*> takeMatching(KDThread* thread, const std::function<boo
     return taken;
 }
 
+// A record named by a listener or a request may belong to a thread that has
+// ended (its owner is destroyed late, during the process's exit): its queue
+// went with it, so there is nothing to take.
+std::vector<QueuedEvent*> takeMatchingIfLive(KDThread* thread,
+                                             const std::function<bool(const KDEvent&)>& match) {
+    std::vector<QueuedEvent*> taken;
+    pal::detail::withLiveThread(thread, [&] { taken = takeMatching(thread, match); });
+    return taken;
+}
+
 void discardUndelivered(KDThread* thread, const std::function<bool(const KDEvent&)>& match) {
-    for (QueuedEvent* queued : takeMatching(thread, match)) {
+    for (QueuedEvent* queued : takeMatchingIfLive(thread, match)) {
         freeUndelivered(queued);
     }
 }
@@ -127,13 +136,17 @@ void post(KDThread* thread, KDEvent* event) {
 }
 
 void discardEvents(KDThread* thread, const std::function<bool(const KDEvent&)>& match) {
-    for (QueuedEvent* queued : takeMatching(thread, match)) {
+    for (QueuedEvent* queued : takeMatchingIfLive(thread, match)) {
         delete queued;
     }
 }
 
+// Called by the owner, or by the record's destructor after it has left the
+// registry of live records.
 void discardAllEvents(KDThread* thread) {
-    discardUndelivered(thread, [](const KDEvent&) { return true; });
+    for (QueuedEvent* queued : takeMatching(thread, [](const KDEvent&) { return true; })) {
+        freeUndelivered(queued);
+    }
 }
 
 void pumpThread(KDThread* self) {
@@ -157,7 +170,9 @@ using pal::detail::QueuedEvent;
 
 extern "C" {
 
-KDEvent* kdCreateEvent(void) { return &(new QueuedEvent())->event; }
+KDEvent* kdCreateEvent(void) {
+    return &(new QueuedEvent())->event;
+}
 
 void kdFreeEvent(KDEvent* event) {
     if (event != nullptr) {
@@ -165,7 +180,9 @@ void kdFreeEvent(KDEvent* event) {
     }
 }
 
-KDint kdPostEvent(KDEvent* event) { return kdPostThreadEvent(event, kdThreadSelf()); }
+KDint kdPostEvent(KDEvent* event) {
+    return kdPostThreadEvent(event, kdThreadSelf());
+}
 
 KDint kdPostThreadEvent(KDEvent* event, KDThread* thread) {
     if (event == nullptr || thread == nullptr) {
@@ -178,6 +195,9 @@ KDint kdPostThreadEvent(KDEvent* event, KDThread* thread) {
 
 KDint kdInstallCallback(KDCallbackFunc* func, KDint eventtype, void* eventuserptr) {
     KDThread* self = kdThreadSelf();
+    if (self == nullptr) {
+        return -1;
+    }
     if (func != nullptr) {
         self->callbacks[{eventtype, eventuserptr}] = func;
         return 0;
@@ -195,12 +215,18 @@ KDint kdInstallCallback(KDCallbackFunc* func, KDint eventtype, void* eventuserpt
 
 void kdPumpEvents(void) {
     KDThread* self = kdThreadSelf();
+    if (self == nullptr) {
+        return;
+    }
     pal::detail::fireDueTimers(self);
     pal::detail::pumpThread(self);
 }
 
 const KDEvent* kdWaitEvent(KDust timeout) {
     KDThread* self = kdThreadSelf();
+    if (self == nullptr) {
+        return nullptr;
+    }
     delete self->lastReturned;
     self->lastReturned = nullptr;
 

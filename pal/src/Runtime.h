@@ -12,6 +12,8 @@ namespace pal::detail {
 
 // The thread that called pal::start(), or null before.
 KDThread* mainThread();
+// Clears the main thread when its record, `ending`, is torn down.
+void forgetMainThread(KDThread* ending);
 
 // Posts a copy-free event to a thread's queue; takes ownership (kdPostThreadEvent).
 void post(KDThread* thread, KDEvent* event);

@@ -15,9 +15,13 @@ const int kHandleWord = 1;
 }  // namespace
 
 KDint SimListenerSet::add(void* userptr) {
+    KDThread* thread = kdThreadSelf();
+    if (thread == nullptr) {
+        return 0;
+    }
     std::lock_guard<std::mutex> lock(mutex_);
     const KDint handle = nextHandle_++;
-    listeners_.emplace(handle, Listener{kdThreadSelf(), userptr});
+    listeners_.emplace(handle, Listener{thread, userptr});
     return handle;
 }
 

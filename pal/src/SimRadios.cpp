@@ -80,9 +80,13 @@ void kdStopListeningNetworkReachabilityStatusZVR(KDint handle) {
 }
 
 KDint kdLocationStartZVR(void) {
+    KDThread* thread = kdThreadSelf();
+    if (thread == nullptr) {
+        return -1;
+    }
     std::lock_guard<std::mutex> lock(gMutex);
     gState.locationStarted = true;
-    gState.locationThread = kdThreadSelf();
+    gState.locationThread = thread;
     return 0;
 }
 

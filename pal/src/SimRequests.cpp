@@ -221,6 +221,9 @@ KDint startRequest(Kind kind, void* userptr) {
     KDint handle = 0;
     Answer answerScript;
     KDThread* thread = kdThreadSelf();
+    if (thread == nullptr) {
+        return 0;
+    }
     {
         std::lock_guard<std::mutex> lock(gMutex);
         const Script& script = gState.scripts[kind];

@@ -97,8 +97,12 @@ void kdStopListeningProximityEventsZVR(KDint handle) {
 }
 
 KDAccelerometerZVR* kdAcquireAccelerometerZVR(void* userptr) {
+    KDThread* thread = kdThreadSelf();
+    if (thread == nullptr) {
+        return nullptr;
+    }
     auto accelerometer = std::make_unique<KDAccelerometerZVR>();
-    accelerometer->thread = kdThreadSelf();
+    accelerometer->thread = thread;
     accelerometer->userptr = userptr;
     KDAccelerometerZVR* handle = accelerometer.get();
     std::lock_guard<std::mutex> lock(gMutex);

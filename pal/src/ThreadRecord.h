@@ -19,11 +19,13 @@ namespace pal::detail {
 // handed to callers converts back to the record.
 struct QueuedEvent {
     KDEvent event{};
-    KDTimer* timer = nullptr;              // set for timer events, so cancelling purges them
-    std::function<void()> action;          // set for scheduled actions; run instead of dispatch
+    KDTimer* timer = nullptr;      // set for timer events, so cancelling purges them
+    std::function<void()> action;  // set for scheduled actions; run instead of dispatch
 };
 
-inline QueuedEvent* queuedEventOf(KDEvent* event) { return reinterpret_cast<QueuedEvent*>(event); }
+inline QueuedEvent* queuedEventOf(KDEvent* event) {
+    return reinterpret_cast<QueuedEvent*>(event);
+}
 
 struct CallbackKeyHash {
     std::size_t operator()(const std::pair<KDint, void*>& key) const {
@@ -42,7 +44,7 @@ struct KDThread {
     std::mutex queueMutex;
     std::condition_variable queueChanged;
     std::deque<pal::detail::QueuedEvent*> queue;
-    bool ownerWaiting = false;  // guarded by queueMutex; posters notify only then
+    bool ownerWaiting = false;              // guarded by queueMutex; posters notify only then
     std::atomic<int> signalsInProgress{0};  // posters between unlocking and notifying
     std::mutex inFlightMutex;
     std::deque<pal::detail::QueuedEvent*> inFlight;
@@ -66,8 +68,14 @@ struct KDThread {
 namespace pal::detail {
 
 // The calling thread's record, created on first use for threads the layer did
-// not start (the process's main thread, test threads).
+// not start (the process's main thread, test threads). Null, after one log
+// line, once the thread's record has been torn down with its thread-local
+// storage: a library object destroyed during the process's exit must not
+// reach the freed record.
 KDThread* currentThread();
+// Runs action while thread's record is certain to stay alive, and returns
+// true; returns false without running it when the record is gone.
+bool withLiveThread(KDThread* thread, const std::function<void()>& action);
 // Wakes every thread blocked in kdWaitEvent so it re-reads the clock.
 void wakeAllThreads();
 // Pops and dispatches queued events; used by kdPumpEvents and advanceTime.

@@ -17,14 +17,15 @@
 namespace {
 
 // Every live thread record, so that advancing the virtual clock can wake the
-// threads waiting on it.
+// threads waiting on it. Never destroyed: records end during the process's
+// exit, after static objects may have gone.
 std::mutex& registryMutex() {
-    static std::mutex mutex;
-    return mutex;
+    static std::mutex* mutex = new std::mutex();
+    return *mutex;
 }
 std::set<KDThread*>& registry() {
-    static std::set<KDThread*> threads;
-    return threads;
+    static std::set<KDThread*>* threads = new std::set<KDThread*>();
+    return *threads;
 }
 
 void registerThread(KDThread* thread) {
@@ -32,10 +33,36 @@ void registerThread(KDThread* thread) {
     registry().insert(thread);
 }
 
-// Records of threads the layer started are owned by kdThreadJoin (or by the
-// thread itself when detached); records of other threads by this holder.
 thread_local KDThread* t_current = nullptr;
-thread_local std::unique_ptr<KDThread> t_adopted;
+// Set when the thread's adopted record is torn down; trivially destructible,
+// so it still reads true while the process's static objects are destroyed.
+thread_local bool t_recordEnded = false;
+
+// Records of threads the layer started are owned by kdThreadJoin (or by the
+// thread itself when detached); records of other threads by this holder,
+// which goes with the thread's thread-local storage.
+struct AdoptedRecord {
+    KDThread* record = nullptr;
+    ~AdoptedRecord() {
+        if (record == nullptr) {
+            return;
+        }
+        t_current = nullptr;
+        t_recordEnded = true;
+        pal::detail::forgetMainThread(record);
+        delete record;
+    }
+};
+thread_local AdoptedRecord t_adopted;
+
+void reportCallAfterEnd() {
+    static std::atomic<bool> reported{false};
+    if (!reported.exchange(true)) {
+        pal::detail::writeLogLine(
+            "platform call after the calling thread's platform state was torn down: refused");
+    }
+    kdSetError(KD_EINVAL);
+}
 
 void* threadTrampoline(void* argument) {
     KDThread* self = static_cast<KDThread*>(argument);
@@ -50,7 +77,9 @@ void* threadTrampoline(void* argument) {
 
 std::atomic<bool> gCreationRefused{false};
 
-int policyToPosix(KDint policy) { return policy == KD_THREAD_POLICY_BACKGROUND_ZVR ? SCHED_IDLE : SCHED_OTHER; }
+int policyToPosix(KDint policy) {
+    return policy == KD_THREAD_POLICY_BACKGROUND_ZVR ? SCHED_IDLE : SCHED_OTHER;
+}
 
 // Linux lets any thread into SCHED_IDLE, but only a process with CAP_SYS_NICE
 // or an RLIMIT_NICE of 20 may take it out again. Rather than model those
@@ -93,13 +122,27 @@ KDThread::~KDThread() {
 namespace pal::detail {
 
 KDThread* currentThread() {
-    if (t_current == nullptr) {
-        t_adopted = std::make_unique<KDThread>();
-        t_adopted->handle = pthread_self();
-        t_current = t_adopted.get();
-        registerThread(t_current);
+    if (t_current != nullptr) {
+        return t_current;
     }
+    if (t_recordEnded) {
+        reportCallAfterEnd();
+        return nullptr;
+    }
+    t_adopted.record = new KDThread();
+    t_adopted.record->handle = pthread_self();
+    t_current = t_adopted.record;
+    registerThread(t_current);
     return t_current;
+}
+
+bool withLiveThread(KDThread* thread, const std::function<void()>& action) {
+    std::lock_guard<std::mutex> lock(registryMutex());
+    if (registry().count(thread) == 0) {
+        return false;
+    }
+    action();
+    return true;
 }
 
 void wakeAllThreads() {
@@ -154,13 +197,17 @@ KDint kdThreadDetach(KDThread* thread) {
     return 0;
 }
 
-KDThread* kdThreadSelf(void) { return pal::detail::currentThread(); }
+KDThread* kdThreadSelf(void) {
+    return pal::detail::currentThread();
+}
 
 KDboolean kdThreadIsMainZVR(void) {
     return pal::detail::mainThread() != nullptr && pal::detail::mainThread() == kdThreadSelf();
 }
 
-void kdThreadYieldZVR(void) { sched_yield(); }
+void kdThreadYieldZVR(void) {
+    sched_yield();
+}
 
 KDint kdThreadGetSchedParamZVR(KDThread* thread, KDint* policy, KDint* param) {
     if (thread == nullptr) {
@@ -230,9 +277,13 @@ KDint kdThreadMutexFree(KDThreadMutex* mutex) {
     return 0;
 }
 
-KDint kdThreadMutexLock(KDThreadMutex* mutex) { return pthread_mutex_lock(&mutex->mutex) == 0 ? 0 : -1; }
+KDint kdThreadMutexLock(KDThreadMutex* mutex) {
+    return pthread_mutex_lock(&mutex->mutex) == 0 ? 0 : -1;
+}
 
-KDint kdThreadMutexUnlock(KDThreadMutex* mutex) { return pthread_mutex_unlock(&mutex->mutex) == 0 ? 0 : -1; }
+KDint kdThreadMutexUnlock(KDThreadMutex* mutex) {
+    return pthread_mutex_unlock(&mutex->mutex) == 0 ? 0 : -1;
+}
 
 KDThreadCond* kdThreadCondCreate(const void*) {
     KDThreadCond* cond = new KDThreadCond();
@@ -249,9 +300,13 @@ KDint kdThreadCondFree(KDThreadCond* cond) {
     return 0;
 }
 
-KDint kdThreadCondSignal(KDThreadCond* cond) { return pthread_cond_signal(&cond->cond) == 0 ? 0 : -1; }
+KDint kdThreadCondSignal(KDThreadCond* cond) {
+    return pthread_cond_signal(&cond->cond) == 0 ? 0 : -1;
+}
 
-KDint kdThreadCondBroadcast(KDThreadCond* cond) { return pthread_cond_broadcast(&cond->cond) == 0 ? 0 : -1; }
+KDint kdThreadCondBroadcast(KDThreadCond* cond) {
+    return pthread_cond_broadcast(&cond->cond) == 0 ? 0 : -1;
+}
 
 KDint kdThreadCondWait(KDThreadCond* cond, KDThreadMutex* mutex) {
     return pthread_cond_wait(&cond->cond, &mutex->mutex) == 0 ? 0 : -1;
@@ -261,11 +316,15 @@ KDint kdThreadCondWait(KDThreadCond* cond, KDThreadMutex* mutex) {
 
 namespace pal {
 
-void setThreadCreationRefused(bool refused) { gCreationRefused.store(refused); }
+void setThreadCreationRefused(bool refused) {
+    gCreationRefused.store(refused);
+}
 
 namespace detail {
 
-void resetThreads() { gCreationRefused.store(false); }
+void resetThreads() {
+    gCreationRefused.store(false);
+}
 
 }  // namespace detail
 }  // namespace pal

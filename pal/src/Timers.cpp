@@ -56,7 +56,9 @@ KDust realMonotonicNanos() {
     return static_cast<KDust>(now.tv_sec) * 1000000000ull + static_cast<KDust>(now.tv_nsec);
 }
 
-KDust currentTime(const Clock& c) { return c.isVirtual.load() ? c.virtualNow.load() : realMonotonicNanos(); }
+KDust currentTime(const Clock& c) {
+    return c.isVirtual.load() ? c.virtualNow.load() : realMonotonicNanos();
+}
 
 // Moves a fired timer to its next due time; returns the event to post.
 KDEvent* fireLocked(Clock& c, KDTimer* timer, KDust now) {
@@ -95,7 +97,8 @@ KDTimer* earliestDueLocked(Clock& c, KDust limit, KDThread* ownerOrNull) {
     return earliest;
 }
 
-KDTimer* addTimer(KDThread* owner, KDint64 interval, KDint mode, void* userptr, std::function<void()> action) {
+KDTimer* addTimer(KDThread* owner, KDint64 interval, KDint mode, void* userptr,
+                  std::function<void()> action) {
     Clock& c = theClock();
     KDTimer* timer = new KDTimer();
     timer->owner = owner;
@@ -188,7 +191,8 @@ KDint64 nanosUntilNextTimer(KDThread* self) {
 }
 
 ActionId scheduleAction(KDThread* owner, KDust delay, std::function<void()> action) {
-    KDTimer* timer = addTimer(owner, static_cast<KDint64>(delay), KD_TIMER_ONESHOT, nullptr, std::move(action));
+    KDTimer* timer =
+        addTimer(owner, static_cast<KDint64>(delay), KD_TIMER_ONESHOT, nullptr, std::move(action));
     if (owner != kdThreadSelf()) {
         owner->queueChanged.notify_all();  // its wait may need to end sooner now
     }
@@ -230,11 +234,16 @@ void useRealClock() {
     c.isVirtual = false;
 }
 
-bool isVirtualClock() { return theClock().isVirtual.load(); }
+bool isVirtualClock() {
+    return theClock().isVirtual.load();
+}
 
 void advanceTime(KDust nanoseconds) {
     Clock& c = theClock();
     KDThread* self = kdThreadSelf();
+    if (self == nullptr) {
+        return;
+    }
     KDust target;
     {
         std::lock_guard<std::mutex> lock(c.mutex);
@@ -267,7 +276,8 @@ void advanceTime(KDust nanoseconds) {
 int activeTimerCount() {
     Clock& c = theClock();
     std::lock_guard<std::mutex> lock(c.mutex);
-    return static_cast<int>(std::count_if(c.timers.begin(), c.timers.end(), [](KDTimer* t) { return t->active; }));
+    return static_cast<int>(
+        std::count_if(c.timers.begin(), c.timers.end(), [](KDTimer* t) { return t->active; }));
 }
 
 std::uint64_t timerFireCount() {
@@ -290,15 +300,18 @@ void resetTimerFireCount() {
 
 extern "C" {
 
-KDust kdGetTimeUST(void) { return currentTime(theClock()); }
+KDust kdGetTimeUST(void) {
+    return currentTime(theClock());
+}
 
 KDtime kdTime(KDtime* timep) {
     KDtime seconds;
     {
         Clock& c = theClock();
         std::lock_guard<std::mutex> lock(c.mutex);
-        seconds = c.isVirtual ? c.wallAtStart + static_cast<KDtime>((c.virtualNow - c.virtualStart) / 1000000000ull)
-                              : static_cast<KDtime>(::time(nullptr));
+        seconds = c.isVirtual
+                      ? c.wallAtStart + static_cast<KDtime>((c.virtualNow - c.virtualStart) / 1000000000ull)
+                      : static_cast<KDtime>(::time(nullptr));
     }
     if (timep != nullptr) {
         *timep = seconds;
@@ -312,7 +325,11 @@ KDTimer* kdSetTimer(KDint64 interval, KDint periodic, void* eventuserptr) {
         kdSetError(KD_EINVAL);
         return nullptr;
     }
-    return addTimer(kdThreadSelf(), interval, periodic, eventuserptr, nullptr);
+    KDThread* self = kdThreadSelf();
+    if (self == nullptr) {
+        return nullptr;
+    }
+    return addTimer(self, interval, periodic, eventuserptr, nullptr);
 }
 
 KDint kdCancelTimer(KDTimer* timer) {

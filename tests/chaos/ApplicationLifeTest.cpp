@@ -18,7 +18,7 @@ class ApplicationLifeTest : public ::testing::TestWithParam<std::uint64_t> {};
 
 TEST_P(ApplicationLifeTest, KeepsEveryPromiseThroughALifeFromASeed) {
     ChaosServer server;
-    ApplicationLife life(server, ApplicationLife::Switches());
+    ApplicationLife life(server);
     const std::vector<std::uint8_t> bytes = ByteScript::expandSeed(GetParam(), kScriptBytes);
     ByteScript script(bytes.data(), bytes.size());
 

@@ -52,6 +52,29 @@ protected:
     void* objectB = &objects[1];
 };
 
+// A handler may remove another handler whose event waits in the same pump,
+// remove itself, and pump again from inside its call.
+void removingHandler(const KDEvent* event) {
+    gCalls.emplace_back("removing", event->userptr);
+    int* objects = static_cast<int*>(event->userptr);
+    kdInstallCallback(nullptr, KD_EVENT_USER, &objects[1]);
+    kdInstallCallback(nullptr, KD_EVENT_USER, event->userptr);
+    kdPumpEvents();
+}
+
+TEST_F(EventsTest, HandlerMayRemoveAnotherAndItselfAndPumpAgainFromInsideItsCall) {
+    kdInstallCallback(removingHandler, KD_EVENT_USER, objectA);
+    kdInstallCallback(exactHandler, KD_EVENT_USER, objectB);
+    kdInstallCallback(fallbackHandler, KD_EVENT_USER + 1, nullptr);
+    postUserEvent(KD_EVENT_USER, objectA);
+    postUserEvent(KD_EVENT_USER, objectB);
+    postUserEvent(KD_EVENT_USER + 1, objectB);
+    postUserEvent(KD_EVENT_USER, objectA);
+    kdPumpEvents();
+    kdPumpEvents();
+    EXPECT_EQ(gCalls, (Calls{{"removing", objectA}, {"fallback", objectB}}));
+}
+
 TEST_F(EventsTest, DispatchPrefersExactUserPointerThenFallsBackToNull) {
     kdInstallCallback(exactHandler, KD_EVENT_USER, objectA);
     kdInstallCallback(fallbackHandler, KD_EVENT_USER, nullptr);

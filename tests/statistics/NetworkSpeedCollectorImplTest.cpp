@@ -219,6 +219,63 @@ TEST_F(NetworkSpeedCollectorImplTest, IdIsReusedOnlyAfterItsRequestEnded) {
     expectAssertion("oldItem->finished && \"unfinished request with the same id already exists\"");
 }
 
+// Chunks may come seldom (the scan period is the server's to set) while a
+// map downloads hundreds of tiles: only what pop() can hand out is held.
+TEST_F(NetworkSpeedCollectorImplTest, HoldsNoMoreRecordsThanOnePopHandsOut) {
+    const int kRequests = 300;
+    std::vector<boost::shared_ptr<Network::HttpConnection> > connections;
+    for (int id = 1; id <= kRequests; ++id) {
+        connections.push_back(idleConnection(id, "/tile/" + std::to_string(id)));
+        collector->onRequestSent(id, connections.back().get());
+        collector->onRequestFinished(id);
+    }
+    awaitReports(2 * kRequests);
+    EXPECT_EQ(NetworkSpeedCollectorImpl::MAX_REQUEST_COUNT, collector->getRecordCount());
+
+    // The same batch as without the bound.
+    Requests out = pop();
+    ASSERT_EQ(10u, out.size());
+    for (int i = 0; i < 10; ++i) {
+        EXPECT_EQ("/tile/" + std::to_string(i + 1), out[i]->path);
+        EXPECT_TRUE(out[i]->finished);
+    }
+    EXPECT_TRUE(hasLogLine("NetworkSpeedCollectorImpl::pop()[requests count: 300; output list size: 10]"));
+
+    // A full window refuses newcomers only: a finished id may still be reused.
+    for (int id = 1; id <= 11; ++id) {
+        collector->onRequestSent(id, connections[id - 1].get());
+    }
+    collector->onRequestFinished(3);
+    collector->onRequestSent(3, connections[299].get());
+    awaitReports(2 * kRequests + 13);
+    out = pop();
+    ASSERT_EQ(10u, out.size());
+    EXPECT_EQ("/tile/300", out[2]->path);
+    EXPECT_TRUE(hasLogLine("NetworkSpeedCollectorImpl::pop()[requests count: 11; output list size: 10]"));
+}
+
+TEST_F(NetworkSpeedCollectorImplTest, RecordsNothingWhileSwitchedOff) {
+    boost::shared_ptr<Network::HttpConnection> first = idleConnection(1, "/first");
+    boost::shared_ptr<Network::HttpConnection> second = idleConnection(2, "/second");
+    collector->onRequestSent(1, first.get());
+    awaitReports(1);
+    collector->setRecording(false);
+    EXPECT_EQ(0, collector->getRecordCount());
+
+    Network::DataChunk data(reinterpret_cast<const unsigned char*>("abc"), 3);
+    collector->onDataChunkReceived(1, &data);
+    collector->onRequestSent(2, second.get());
+    awaitReports(3);
+    EXPECT_TRUE(pop().empty());
+
+    collector->setRecording(true);
+    collector->onRequestSent(1, first.get());
+    awaitReports(4);
+    Requests out = pop();
+    ASSERT_EQ(1u, out.size());
+    EXPECT_EQ("/first", out[0]->path);
+}
+
 TEST_F(NetworkSpeedCollectorImplTest, NullReportsAreRefused) {
     collector->onRequestSent(1, nullptr);
     collector->onDataChunkReceived(1, nullptr);

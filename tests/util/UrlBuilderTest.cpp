@@ -1,4 +1,5 @@
 #include "support/PalTest.h"
+#include "support/ScopedLocale.h"
 #include "util/GeoUrlBuilder.h"
 #include "util/UrlBuilder.h"
 
@@ -33,7 +34,9 @@ TEST(UrlBuilderTest, FirstParameterFollowsQuestionMarkLaterOnesAmpersandAlsoAfte
     EXPECT_EQ("http://new/base?c=3&d=4", builder.buildString());
 }
 
-TEST(UrlBuilderTest, WritesNumbersAndCoordinatesInTheirFixedFormsAndOrder) {
+namespace {
+
+void expectFixedForms() {
     GeoUrlBuilder builder("u");
     builder.addUIntParam("u", 4000000000u)
         .addIntPairParam("ip", -3, 7)
@@ -46,6 +49,21 @@ TEST(UrlBuilderTest, WritesNumbersAndCoordinatesInTheirFixedFormsAndOrder) {
         "u?u=4000000000&ip=-3,7&fp=37.500000,55.250000&f2=0.33&f=10000000.000000"
         "&ll=13.400000,52.500000&la=52.500000,13.400000&bbox=1.000000,-2.500000~3.125000,4.000000",
         builder.buildString());
+}
+
+}  // namespace
+
+TEST(UrlBuilderTest, WritesNumbersAndCoordinatesInTheirFixedFormsAndOrder) {
+    expectFixedForms();
+}
+
+// A global locale of the application must not group digits or put a decimal comma into a URL.
+TEST(UrlBuilderTest, WritesTheSameFormsUnderADecimalCommaLocale) {
+    ScopedLocale german("de_DE.UTF-8");
+    if (!german.active()) {
+        GTEST_SKIP() << "no de_DE.UTF-8 locale";
+    }
+    expectFixedForms();
 }
 
 class UrlBuilderAssertionTest : public PalTest {};

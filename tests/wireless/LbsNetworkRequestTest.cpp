@@ -10,6 +10,7 @@
 #include <vector>
 
 #include "network/NetworkManager.h"
+#include "network/impl/NetworkManagerImpl.h"
 #include "startup/StartupData.h"
 #include "support/PalTest.h"
 #include "support/TestHttpServer.h"
@@ -159,6 +160,45 @@ TEST_F(LbsNetworkRequestTest, WaitsForTheStartupAnswer) {
     Network::NetworkManager::getInstance()->changeOfflineModeStatus(Network::NetworkManager::OfflineModeOff);
     ASSERT_TRUE(runUntil([this] { return !responses.empty(); }));
     EXPECT_EQ(0, responses[0].error);
+    EXPECT_EQ(1u, server.requestCount());
+}
+
+// The network provider drops its request on pause and replaces it every 15
+// seconds: an answer that found the network offline must not bring the
+// exchange back once offline mode ends, whether its owner is gone or not.
+TEST_F(LbsNetworkRequestTest, RequestFinishedOfflineIsNotRunAgainAfterItsOwnerWentAway) {
+    answer(located("1", "2", "3"));
+    pal::setReachability(KD_NETWORK_NOT_REACHABLE_ZVR);
+    submit();
+    ASSERT_TRUE(runUntil([this] { return !responses.empty(); }));
+    request.reset();
+
+    pal::setReachability(KD_NETWORK_REACHABLE_VIA_WIFI_ZVR);
+    Network::NetworkManager::getInstance()->changeOfflineModeStatus(Network::NetworkManager::OfflineModeOff);
+    pump();
+
+    const Network::NetworkManagerImpl* manager =
+        static_cast<Network::NetworkManagerImpl*>(Network::NetworkManager::getInstance());
+    EXPECT_EQ(0, manager->getTaskCount());
+    EXPECT_EQ(0, manager->getUnreadyCount());
+    EXPECT_EQ(0u, server.requestCount());
+}
+
+TEST_F(LbsNetworkRequestTest, RequestFinishedOfflineReportsOnceAndItsOwnerCanSubmitAgain) {
+    answer(located("1", "2", "3"));
+    pal::setReachability(KD_NETWORK_NOT_REACHABLE_ZVR);
+    submit();
+    ASSERT_TRUE(runUntil([this] { return !responses.empty(); }));
+    EXPECT_NE(0, responses[0].error);
+
+    pal::setReachability(KD_NETWORK_REACHABLE_VIA_WIFI_ZVR);
+    Network::NetworkManager::getInstance()->changeOfflineModeStatus(Network::NetworkManager::OfflineModeOff);
+    pump();
+    EXPECT_EQ(
+        0, static_cast<Network::NetworkManagerImpl*>(Network::NetworkManager::getInstance())->getTaskCount());
+    const LbsNetworkRequest::Response response = submitAndWait();
+
+    EXPECT_EQ(0, response.error);
     EXPECT_EQ(1u, server.requestCount());
 }
 

@@ -1,6 +1,10 @@
 // The one-shot radio requests over the simulated platform radios.
+#include <gmock/gmock.h>
+#include <unistd.h>
+
 #include <boost/make_shared.hpp>
 #include <boost/shared_ptr.hpp>
+#include <cstdlib>
 #include <string>
 #include <vector>
 
@@ -166,6 +170,32 @@ TEST_F(RadioRequestTest, TelephonyAnswersAndRefusalsEachReportOnce) {
         EXPECT_EQ("", receiver.cells[i]->getOperatorId() + receiver.cells[i]->getCountryCode()) << i;
         EXPECT_FALSE(receiver.strengths[i].first) << i;
     }
+}
+
+// Runs in a child process: a request still waiting for its answer is held in
+// a static and so destroyed during the exit, after the platform layer shut
+// down and after the main thread's platform state went with its
+// thread-local storage.
+void exitWithARequestHeldInAStatic(Receiver* receiver) {
+    static boost::shared_ptr<TelephonyNetworkInfoRequest> held;
+    pal::scriptCellInfo(pal::Answer::never(), {true, 1, 2, "26201", "262"});
+    held = boost::make_shared<TelephonyNetworkInfoRequest>();
+    held->start(receiver->cell());
+    pal::shutdown();
+    pal::setLogSink(pal::LogSink());
+    // A hang is a failure too.
+    alarm(30);
+    std::exit(0);
+}
+
+TEST_F(RadioRequestTest, RequestDestroyedDuringTheExitAfterShutdownIsRefusedCleanlyAndLoggedOnce) {
+    GTEST_FLAG_SET(death_test_style, "fast");
+    const std::string line = "platform call after the calling thread's platform state was torn down: refused";
+    EXPECT_EXIT(exitWithARequestHeldInAStatic(&receiver), ::testing::ExitedWithCode(0),
+                ::testing::Truly([&line](const std::string& output) {
+                    const std::size_t first = output.find(line);
+                    return first != std::string::npos && output.find(line, first + 1) == std::string::npos;
+                }));
 }
 
 }  // namespace

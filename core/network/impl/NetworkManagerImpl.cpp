@@ -152,21 +152,18 @@ void NetworkManagerImpl::cancel(boost::shared_ptr<NetworkTask> request) {
     }
     ScopedLock lock(mutex);
     boost::shared_ptr<NetworkTaskImpl> task = getRequestState<NetworkTaskImpl>(request);
-    if (removeUnready(request)) {
-        if (task) {
-            task->withdraw();
-        }
+    // Whatever the state (queued, running, waiting for a retry, finishing in
+    // its own onFinished, or completed), the owner has let the task go: it
+    // never runs or reports again, so it never reaches for its owner.
+    if (task) {
+        task->withdraw();
+    }
+    if (removeUnready(request) || !task) {
         return;
     }
-    if (!task) {
-        return;
+    if (tasks.erase(task)) {
+        task->unschedule();
     }
-    KD_ASSERT(tasks.count(task));
-    if (!tasks.erase(task)) {
-        return;
-    }
-    task->withdraw();
-    task->unschedule();
 }
 
 bool NetworkManagerImpl::removeUnready(const boost::shared_ptr<NetworkTask>& task) {
@@ -187,18 +184,14 @@ void NetworkManagerImpl::onTaskImplCompleted(boost::shared_ptr<NetworkTaskImpl> 
         offlineModeStatus = OfflineModeOn;
         offlineModeSignal = true;
     }
-    if (!tasks.erase(state)) {
-        DelayedRequests::iterator it = unreadyRequests.begin();
-        while (it != unreadyRequests.end() && (*it)->task != state->getTask()) {
-            ++it;
+    // A task its owner cancelled from inside onFinished has left the
+    // containers already and is not queued again; its code still tells the
+    // statuses what the network did.
+    if (!state->isWithdrawn()) {
+        removeCompleted(state);
+        if (code == OFFLINE_ERROR_CODE) {
+            resubmit(state);
         }
-        KD_ASSERT(it != unreadyRequests.end());
-        if (it != unreadyRequests.end()) {
-            unreadyRequests.erase(it);
-        }
-    }
-    if (code == OFFLINE_ERROR_CODE) {
-        resubmit(state);
     }
     if (offlineModeStatus == OfflineModeOff) {
         submitUnreadyRequests();
@@ -213,6 +206,20 @@ void NetworkManagerImpl::onTaskImplCompleted(boost::shared_ptr<NetworkTaskImpl> 
         post(
             Util::ThreadCallback::Function::make<NetworkManagerImpl,
                                                  &NetworkManagerImpl::signalNetworkErrorStatusChanged>(this));
+    }
+}
+
+void NetworkManagerImpl::removeCompleted(const boost::shared_ptr<NetworkTaskImpl>& state) {
+    if (tasks.erase(state)) {
+        return;
+    }
+    DelayedRequests::iterator it = unreadyRequests.begin();
+    while (it != unreadyRequests.end() && (*it)->task != state->getTask()) {
+        ++it;
+    }
+    KD_ASSERT(it != unreadyRequests.end());
+    if (it != unreadyRequests.end()) {
+        unreadyRequests.erase(it);
     }
 }
 

@@ -88,6 +88,7 @@ private:
     NetworkManagerImpl& operator=(const NetworkManagerImpl&) = delete;
 
     void doSubmit(const boost::shared_ptr<NetworkTaskImpl>& state, long long time, KDThread* thread);
+    void removeCompleted(const boost::shared_ptr<NetworkTaskImpl>& state);
     void resubmit(const boost::shared_ptr<NetworkTaskImpl>& state);
     void submitUnreadyRequests();
     bool removeUnready(const boost::shared_ptr<NetworkTask>& task);

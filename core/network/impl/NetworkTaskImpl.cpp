@@ -188,10 +188,9 @@ void NetworkTaskImpl::onFinished(boost::shared_ptr<HttpConnection>, int code) {
     }
     finished = true;
     task->onFinished(statusCode);
-    // A task cancelled from its own onFinished has left the manager already.
-    if (!withdrawn) {
-        onCompleted(self, code);
-    }
+    // Also when the task was cancelled from its own onFinished: the manager
+    // still learns the code, but queues nothing again.
+    onCompleted(self, code);
 }
 
 void NetworkTaskImpl::onRetry(boost::shared_ptr<NetworkTaskRetryPolicy>) {
@@ -216,9 +215,7 @@ void NetworkTaskImpl::onTimeout(boost::shared_ptr<NetworkTaskRetryPolicy>) {
     unschedule();
     dropConnection();
     task->onFinished(TASK_TIMEOUT_ERROR_CODE);
-    if (!withdrawn) {
-        onCompleted(self, TASK_TIMEOUT_ERROR_CODE);
-    }
+    onCompleted(self, TASK_TIMEOUT_ERROR_CODE);
 }
 
 }  // namespace Network

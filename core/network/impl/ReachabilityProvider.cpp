@@ -24,13 +24,15 @@ void ReachabilityProvider::enable() {
         return;
     }
     enabled = true;
+    // Nobody listened before, so there is nobody to tell about a change. Read
+    // also while paused: resume compares with this value, and a stale one
+    // would hide a network that went and came back in the background.
+    status = kdGetNetworkReachabilityStatusZVR();
     if (paused) {
         return;
     }
     KD_ASSERT(!palListener);
     startListening();
-    // Nobody listened before, so there is nobody to tell about a change.
-    status = kdGetNetworkReachabilityStatusZVR();
 }
 
 void ReachabilityProvider::disable() {

@@ -4,6 +4,7 @@
 
 #include <boost/make_shared.hpp>
 #include <cctype>
+#include <locale>
 #include <sstream>
 
 #include "util/Logger.h"
@@ -75,6 +76,8 @@ void WifiStartupListener::onWifiScanCompleted(
 std::string WifiStartupListener::encode(
     const std::vector<boost::shared_ptr<Wireless::WifiScanResult> >& results) {
     std::ostringstream out;
+    // No digit grouping from a global locale the application may have set.
+    out.imbue(std::locale::classic());
     bool first = true;
     for (const boost::shared_ptr<Wireless::WifiScanResult>& result : results) {
         if (!result || !isPlainBssid(result->getBssid())) {

@@ -28,6 +28,7 @@ std::string text(const char* value) {
 NetworkCollector::NetworkCollector()
     : thread(kdThreadSelf()),
       started(false),
+      paused(false),
       root(boost::make_shared<WifiPoolTag>()),
       scanTimerContext{this},
       sendTimerContext{this},
@@ -39,6 +40,7 @@ NetworkCollector::NetworkCollector()
       speedCollector(NetworkSpeedCollectorImpl::create()) {
     kdInstallCallback(&NetworkCollector::onScanTimerFiredWrapper, KD_EVENT_TIMER, &scanTimerContext);
     kdInstallCallback(&NetworkCollector::onSendTimerFiredWrapper, KD_EVENT_TIMER, &sendTimerContext);
+    updateRecording();
     Network::NetworkManager::getInstance()->setNetworkSpeedCollector(
         boost::weak_ptr<Network::NetworkSpeedCollector>(speedCollector));
 }
@@ -61,6 +63,7 @@ void NetworkCollector::start() {
     manager->addNetworkReachabilityStatusCallback(reachabilityCallback());
     manager->addNetworkErrorStatusCallback(errorCallback());
     started = true;
+    updateRecording();
     startTimers();
 }
 
@@ -70,6 +73,7 @@ void NetworkCollector::stop() {
         return;
     }
     started = false;
+    updateRecording();
     cancelTimers();
     cancelAllRequests();
     Network::NetworkManager* manager = Network::NetworkManager::getInstance();
@@ -148,10 +152,14 @@ bool NetworkCollector::setTimeout(long long& timeout, int seconds, const char* n
 }
 
 void NetworkCollector::onPaused() {
+    paused = true;
+    updateRecording();
     cancelTimers();
 }
 
 void NetworkCollector::onResumed() {
+    paused = false;
+    updateRecording();
     if (started) {
         startTimers();
     }
@@ -170,6 +178,12 @@ void NetworkCollector::onScanTimerFiredWrapper(const KDEvent* event) {
 
 void NetworkCollector::onSendTimerFiredWrapper(const KDEvent* event) {
     static_cast<TimerContext*>(event->userptr)->collector->onSendTimerFired();
+}
+
+// Measurements made while no chunk can take them would only pile up, and
+// while the feature is off they are not ours to send.
+void NetworkCollector::updateRecording() {
+    speedCollector->setRecording(started && !paused);
 }
 
 void NetworkCollector::startTimers() {
@@ -251,6 +265,20 @@ void NetworkCollector::onSendTimerFired() {
         Logger::log(Logger::Debug, "NetworkCollector::onSendTimerFired()[empty]");
         return;
     }
+    // One upload at a time: while one waits for its answer, or in the network
+    // manager's offline queue, the chunks made since join the next body.
+    if (!networkRequests.empty()) {
+        Logger::log(Logger::Debug, "NetworkCollector::onSendTimerFired()[upload pending]");
+        return;
+    }
+    // Started now, the upload would fail at once and switch the network
+    // manager into offline mode, which only the application ends; the chunks
+    // rather wait here for a period with a network.
+    if (Network::NetworkManager::getInstance()->getNetworkReachabilityStatus() ==
+        Network::NetworkManager::NetworkNotReachable) {
+        Logger::log(Logger::Debug, "NetworkCollector::onSendTimerFired()[not reachable]");
+        return;
+    }
     UrlBuilder builder(baseUrl);
     builder.setAdditionPath("wifipool/2.x/");
     root->appendParams(builder);
@@ -267,7 +295,8 @@ void NetworkCollector::onSendTimerFired() {
     boost::shared_ptr<NetworkCollectorRequest> request = boost::make_shared<NetworkCollectorRequest>(this);
     request->setLang(lang.c_str());
     request->submit(builder.buildString(), body);
-    // Sent chunks are gone whatever the upload's outcome.
+    // The chunks now live in the upload alone: a failed one loses them, one
+    // that finds the network offline waits in the network manager's queue.
     root->removeChildren();
 }
 

@@ -20,6 +20,10 @@ class WifiPoolChunk;
 // uploads the finished ones on a send timer as one gzip-compressed,
 // scrambled document. Owned by the thread that constructs it (which must
 // pump platform events); every call belongs there.
+//
+// At most one upload is pending at a time: a send period that finds one
+// still waiting (for its answer, or in the network manager's offline queue)
+// or the network unreachable keeps its chunks for the next period's body.
 class NetworkCollector : public Location::LocationListener {
 public:
     NetworkCollector();
@@ -52,6 +56,7 @@ public:
     boost::shared_ptr<NetworkSpeedCollectorImpl> getNetworkSpeedCollector() const { return speedCollector; }
 
     // Pause stops the timers and keeps started; resume gives them full periods.
+    // Request measurements are taken only while started and not paused.
     void onPaused();
     void onResumed();
 
@@ -71,6 +76,7 @@ private:
     NetworkCollector(const NetworkCollector&) = delete;
     NetworkCollector& operator=(const NetworkCollector&) = delete;
 
+    void updateRecording();
     void startTimers();
     void cancelTimers();
     void cancelAllRequests();
@@ -88,6 +94,7 @@ private:
 
     KDThread* thread;
     bool started;
+    bool paused;
     boost::shared_ptr<WifiPoolTag> root;
     TimerContext scanTimerContext;
     TimerContext sendTimerContext;

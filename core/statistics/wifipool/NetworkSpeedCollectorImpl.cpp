@@ -42,7 +42,9 @@ NetworkSpeedCollectorImpl::NetworkSpeedCollectorImpl()
                                                &NetworkSpeedCollectorImpl::onChunkReceivedImpl>(this)),
       onRequestCanceledCallback(
           Util::ThreadCallback::Function::make<NetworkSpeedCollectorImpl,
-                                               &NetworkSpeedCollectorImpl::onRequestCanceledImpl>(this)) {}
+                                               &NetworkSpeedCollectorImpl::onRequestCanceledImpl>(this)),
+      recording(true),
+      refusedCount(0) {}
 
 boost::shared_ptr<NetworkSpeedCollectorImpl> NetworkSpeedCollectorImpl::create() {
     kdInstallCallback(&NetworkSpeedCollectorImpl::onDeleteEvent, KD_EVENT_USER, &deleteEventToken);
@@ -115,7 +117,7 @@ void NetworkSpeedCollectorImpl::onRequestSentImpl(ContextPtr context) {
     KD_ASSERT(context);
     boost::shared_ptr<Report> report = boost::static_pointer_cast<Report>(context);
     KD_ASSERT(report->requestInfo);
-    if (!report->requestInfo) {
+    if (!report->requestInfo || !recording) {
         return;
     }
     Location::LocationManager* locationManager = Location::LocationManager::getInstance();
@@ -127,6 +129,11 @@ void NetworkSpeedCollectorImpl::onRequestSentImpl(ContextPtr context) {
             oldItem = report->requestInfo;
             return;
         }
+    }
+    // pop() would drop it unseen.
+    if (requests.size() >= static_cast<std::size_t>(MAX_REQUEST_COUNT)) {
+        ++refusedCount;
+        return;
     }
     requests.push_back(report->requestInfo);
 }
@@ -159,8 +166,17 @@ void NetworkSpeedCollectorImpl::pop(std::vector<boost::shared_ptr<RequestInfo> >
     std::size_t count = std::min(requests.size(), static_cast<std::size_t>(MAX_REQUEST_COUNT));
     outRequests.insert(outRequests.end(), requests.begin(), requests.begin() + count);
     Logger::log(Logger::Debug, "NetworkSpeedCollectorImpl::pop()[requests count: %d; output list size: %d]",
-                static_cast<int>(requests.size()), static_cast<int>(count));
+                static_cast<int>(requests.size()) + refusedCount, static_cast<int>(count));
     requests.clear();
+    refusedCount = 0;
+}
+
+void NetworkSpeedCollectorImpl::setRecording(bool on) {
+    recording = on;
+    if (!on) {
+        requests.clear();
+        refusedCount = 0;
+    }
 }
 
 boost::shared_ptr<RequestInfo> NetworkSpeedCollectorImpl::findRequestInfo(int id) const {

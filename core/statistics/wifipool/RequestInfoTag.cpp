@@ -1,5 +1,6 @@
 #include "statistics/wifipool/RequestInfoTag.h"
 
+#include <locale>
 #include <sstream>
 
 namespace Statistics {
@@ -10,6 +11,8 @@ void RequestInfoTag::appendNodeName(std::string& out) const {
 
 void RequestInfoTag::appendNodeTagText(std::string& out) const {
     std::ostringstream text;
+    // No digit grouping or decimal comma from a global locale the application may have set.
+    text.imbue(std::locale::classic());
     text << "type=\"" << escape(info->path) << "\"";
     if (info->precision == Location::PrecisionSatellite) {
         // Two spaces before lon: the form the server has always been sent.

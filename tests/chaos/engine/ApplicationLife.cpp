@@ -93,14 +93,12 @@ const ApplicationLife::Step ApplicationLife::kSteps[] = {
 };
 const int ApplicationLife::kStepCount = sizeof(kSteps) / sizeof(kSteps[0]);
 
-ApplicationLife::ApplicationLife(ChaosServer& server, const Switches& switches)
+ApplicationLife::ApplicationLife(ChaosServer& server)
     : server(server),
-      switches(switches),
       taskPool(report),
       watcher([this] { onLocationHeard(); }),
       watcherAction(StopCollectorOnPosition),
       watching(false),
-      locationManagerMade(false),
       answer(ChaosServer::Ok),
       reachability(1),
       appPaused(true),
@@ -309,6 +307,7 @@ void ApplicationLife::drain() {
     int round = 0;
     for (; round < kDrainRounds && report.holds(); ++round) {
         settle();
+        endOfflineMode();
         if (manager->getTaskCount() + manager->getUnreadyCount() == 0) {
             break;
         }
@@ -335,11 +334,10 @@ void ApplicationLife::finishHeldTasks() {
     pal::setReachability(reachability);
     taskPool.readyAll();
     // Held-back tasks are looked at again when offline mode ends.
-    Network::NetworkManager* manager = Network::NetworkManager::getInstance();
-    manager->changeOfflineModeStatus(Network::NetworkManager::OfflineModeOn);
-    manager->changeOfflineModeStatus(Network::NetworkManager::OfflineModeOff);
+    Network::NetworkManager::getInstance()->changeOfflineModeStatus(Network::NetworkManager::OfflineModeOn);
     for (int round = 0; round < kDrainRounds && report.holds(); ++round) {
         settle();
+        endOfflineMode();
         if (taskPool.unfinishedCount() == 0) {
             return;
         }
@@ -349,6 +347,13 @@ void ApplicationLife::finishHeldTasks() {
         report.breach(std::to_string(taskPool.unfinishedCount()) + " held tasks never finished within " +
                       std::to_string(kDrainRounds) + " s with the network and the server back");
     }
+}
+
+// Only the application switches offline mode off, as one does that sees the
+// network back; a finish made offline and delivered late switches it on again.
+void ApplicationLife::endOfflineMode() {
+    Network::NetworkManager::getInstance()->changeOfflineModeStatus(Network::NetworkManager::OfflineModeOff);
+    kdPumpEvents();
 }
 
 void ApplicationLife::shutDown() {
@@ -416,22 +421,26 @@ void ApplicationLife::showView(ByteScript& script) {
     if (slot || app == nullptr) {
         return;
     }
-    slot.reset(new ChaosView([this](ChaosView& view) { hideNow(view); }));
+    slot.reset(new ChaosView([this](ChaosView& view, bool deleteNow) { hideNow(view, deleteNow); }));
     app->showView(slot.get());
 }
 
 void ApplicationLife::hideView(ByteScript& script) {
     std::unique_ptr<ChaosView>& slot = views[script.pick(2)];
     if (slot) {
-        hideNow(*slot);
+        hideNow(*slot, script.chance(2));
     }
 }
 
-void ApplicationLife::hideNow(ChaosView& view) {
+void ApplicationLife::hideNow(ChaosView& view, bool deleteNow) {
     for (std::unique_ptr<ChaosView>& slot : views) {
         if (slot.get() == &view) {
             ChaosApp::running()->hideView(&view);
-            hiddenThisStep.push_back(std::move(slot));
+            if (deleteNow) {
+                slot.reset();
+            } else {
+                hiddenThisStep.push_back(std::move(slot));
+            }
             return;
         }
     }
@@ -439,14 +448,10 @@ void ApplicationLife::hideNow(ChaosView& view) {
 
 void ApplicationLife::armView(ByteScript& script) {
     std::unique_ptr<ChaosView>& slot = views[script.pick(2)];
-    ChaosView::Reentry reentry = static_cast<ChaosView::Reentry>(script.pick(ChaosView::ReentryCount));
-    const bool insideTick = reentry == ChaosView::HideOnUpdate || reentry == ChaosView::HideOnRedraw ||
-                            reentry == ChaosView::HideOnSizeChanged;
-    if (insideTick && !switches.hideViewInsideRedrawCallbacks) {
-        reentry = ChaosView::HideOnDraw;
-    }
+    const ChaosView::Reentry reentry = static_cast<ChaosView::Reentry>(script.pick(ChaosView::ReentryCount));
+    const bool deleteToo = script.chance(2);
     if (slot) {
-        slot->arm(reentry);
+        slot->arm(reentry, deleteToo);
     }
 }
 
@@ -476,31 +481,9 @@ void ApplicationLife::touchView(ByteScript& script) {
     }
 }
 
-bool ApplicationLife::networkMayDrop() const {
-    if (appPaused && !switches.reachabilityChangesWhilePaused) {
-        return false;
-    }
-    if (switches.libraryTasksFinishOffline) {
-        return true;
-    }
-    bool positioningExists = false;
-    for (const std::unique_ptr<PositioningSlot>& slot : positioning) {
-        positioningExists = positioningExists || slot->exists();
-    }
-    return !positioningExists && !locationManagerMade && !collector;
-}
-
-bool ApplicationLife::libraryTasksAllowed() const {
-    return switches.libraryTasksFinishOffline || reachability != 0;
-}
-
 void ApplicationLife::changeReachability(ByteScript& script) {
-    const int value = script.pick(3);
-    if (!networkMayDrop()) {
-        return;
-    }
-    reachability = value;
-    pal::setReachability(value);
+    reachability = script.pick(3);
+    pal::setReachability(reachability);
 }
 
 void ApplicationLife::toggleOfflineMode(ByteScript&) {
@@ -530,9 +513,7 @@ void ApplicationLife::submitPositioning(ByteScript& script) {
     PositioningSlot& slot = *positioning[script.pick(kPositioningSlots)];
     const PositioningSlot::Reentry reentry =
         static_cast<PositioningSlot::Reentry>(script.pick(PositioningSlot::ReentryCount));
-    if (libraryTasksAllowed()) {
-        slot.submit(reentry);
-    }
+    slot.submit(reentry);
 }
 
 void ApplicationLife::cancelPositioning(ByteScript& script) {
@@ -546,11 +527,10 @@ void ApplicationLife::dropPositioning(ByteScript& script) {
 void ApplicationLife::startLocation(ByteScript& script) {
     watcherAction = script.pick(ActionCount);
     const bool arm = script.chance(3);
-    if (watching || !libraryTasksAllowed()) {
+    if (watching) {
         return;
     }
     Location::LocationManager::getInstance()->addLocationListener(&watcher);
-    locationManagerMade = true;
     watching = true;
     if (arm) {
         watcher.arm();
@@ -600,12 +580,7 @@ void ApplicationLife::satelliteStatus(ByteScript& script) {
 void ApplicationLife::createCollector(ByteScript& script) {
     const int scanSeconds = 1 + script.pick(5);
     const int sendSeconds = 2 + script.pick(10);
-    if (!libraryTasksAllowed()) {
-        return;
-    }
     if (!collector) {
-        // The collector listens to the location manager, which starts network positioning.
-        locationManagerMade = true;
         collector.reset(new Statistics::NetworkCollector());
         collector->setUuid("chaos-client");
         collector->setModel("Chaos");
@@ -663,7 +638,7 @@ void ApplicationLife::waitForAnswers(ByteScript&) {
 }
 
 void ApplicationLife::hideViewNotShown(ByteScript&) {
-    ChaosView stranger([](ChaosView&) {});
+    ChaosView stranger([](ChaosView&, bool) {});
     {
         std::lock_guard<std::mutex> lock(recordsMutex);
         expectedAssertion = kHideNotShownAssertion;
@@ -679,11 +654,6 @@ void ApplicationLife::hideViewNotShown(ByteScript&) {
 // The first call makes the controller, which fetches at once and on every
 // resume; later calls start a new cycle over a running one.
 void ApplicationLife::fetchStartup(ByteScript&) {
-    if (!libraryTasksAllowed()) {
-        return;
-    }
-    // Its listeners ask the location manager for the last position.
-    locationManagerMade = true;
     if (Startup::StartupController::getExistingInstance() == nullptr) {
         Startup::StartupController::getInstance();
     } else {

@@ -23,37 +23,26 @@ class NetworkCollector;
 // against loopback servers, steered by a byte script. It starts the platform
 // layer, reads one step after another (an opcode, then its arguments) and
 // plays it: pause and resume, views shown and hidden (also from inside their
-// redraw callbacks), reachability and offline mode, network tasks, positioning
-// requests, the location manager, satellite fixes, the statistics collector,
-// the startup controller, server answers, re-entries from callbacks and time. After every step it
-// checks that nothing asserted unless the step misused the library on
-// purpose, that no task or request was heard from after its owner let it go,
-// and that live tasks and buffered bytes stay bounded. At the end it takes
-// everything down, waits for every queue to drain, shuts the platform layer
-// down and checks that nothing is left.
+// redraw callbacks), reachability and offline mode, network tasks,
+// positioning requests, the location manager, satellite fixes, the statistics
+// collector, the startup controller, server answers, re-entries from
+// callbacks and time. After every step it checks that nothing asserted unless
+// the step misused the library on purpose, that no task or request was heard
+// from after its owner let it go or after its final callback, and that live
+// tasks and buffered bytes stay bounded. At the end it brings the network, the
+// server and the application back and requires every task still held to
+// finish, takes everything down, waits for every queue to drain, shuts the
+// platform layer down and checks that nothing is left.
 //
 // Runs on the calling thread, which becomes the platform's main thread; one
 // life at a time per process.
 class ApplicationLife {
 public:
-    // Re-entries that reach faults being repaired elsewhere; each is switched
-    // on once its fix has landed.
-    struct Switches {
-        // Views hidden from inside update(), redraw() and onSizeChanged().
-        bool hideViewInsideRedrawCallbacks = false;
-        // Positioning requests, the location manager and statistics uploads
-        // running while the network is unreachable, so that their tasks finish
-        // offline and are queued again.
-        bool libraryTasksFinishOffline = false;
-        // Reachability changing while the application is paused.
-        bool reachabilityChangesWhilePaused = false;
-    };
-
     // Bounds checked after every step.
     static const int kMaxLiveTasks = 64;
     static const std::size_t kMaxQueuedBytes = 256 * 1024;
 
-    ApplicationLife(ChaosServer& server, const Switches& switches);
+    explicit ApplicationLife(ChaosServer& server);
     ~ApplicationLife();
 
     // Plays the script to its end or to maxSteps. True when every promise held.
@@ -79,6 +68,7 @@ private:
     void startApplication();
     void drain();
     void finishHeldTasks();
+    void endOfflineMode();
     void shutDown();
     void checkInvariants();
     void checkAssertions();
@@ -119,17 +109,13 @@ private:
     void hideViewNotShown(ByteScript& script);
     void fetchStartup(ByteScript& script);
 
-    // Hides a shown view now and deletes it at the end of the step.
-    void hideNow(ChaosView& view);
+    // Hides a shown view now and deletes it now or at the end of the step.
+    void hideNow(ChaosView& view, bool deleteNow);
     void onLocationHeard();
     void onAppPauseChanged(bool paused);
     void setAnswer(ChaosServer::Answer answer);
-    // Whether library tasks may run now without finishing offline.
-    bool libraryTasksAllowed() const;
-    bool networkMayDrop() const;
 
     ChaosServer& server;
-    Switches switches;
     InvariantReport report;
     TaskPool taskPool;
     std::vector<std::unique_ptr<PositioningSlot> > positioning;
@@ -138,7 +124,6 @@ private:
     LocationWatcher watcher;
     int watcherAction;
     bool watching;
-    bool locationManagerMade;
     std::unique_ptr<Statistics::NetworkCollector> collector;
     ChaosServer::Answer answer;
     int reachability;

@@ -3,8 +3,12 @@
 #include <GLES/gl.h>
 
 void ChaosView::update(int elapsedMs) {
+    // The size check may hide and delete this view through onSizeChanged().
+    const std::shared_ptr<bool> stillAlive = alive;
     BaseView::update(elapsedMs);
-    hideIf(HideOnUpdate);
+    if (*stillAlive) {
+        hideIf(HideOnUpdate);
+    }
 }
 
 void ChaosView::redraw() {
@@ -29,6 +33,6 @@ bool ChaosView::hideIf(Reentry due) {
         return false;
     }
     reentry = NoReentry;
-    hideHook(*this);
+    hideHook(*this, deleteInside);
     return true;
 }

@@ -2,6 +2,7 @@
 
 #include "io/ByteArrayOutputStream.h"
 #include "io/zip/GzipOutputStream.h"
+#include "network/NetworkErrorCodes.h"
 #include "network/NetworkManager.h"
 #include "statistics/wifipool/NetworkCollector.h"
 #include "statistics/wifipool/UploadConstants.h"
@@ -61,6 +62,12 @@ void NetworkCollectorRequest::onBytesReceived(const std::vector<unsigned char>& 
 void NetworkCollectorRequest::onFinished(int resultCode) {
     Logger::log(Logger::Debug, "NetworkCollectorRequest::onFinished()[resultCode: %d]", resultCode);
     isFinished = true;
+    // An upload that found the network offline is queued to run again once
+    // offline mode ends; it stays in the collector's set so that stop()
+    // still withdraws it.
+    if (resultCode == Network::OFFLINE_ERROR_CODE) {
+        return;
+    }
     // Leaving the set may release the last reference to us.
     boost::shared_ptr<NetworkCollectorRequest> thiz = shared_from_this();
     KD_ASSERT(collector->networkRequests.count(thiz));
