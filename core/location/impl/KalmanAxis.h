@@ -22,6 +22,10 @@ public:
     void predict(float seconds, float accelerationDensity);
 
     void measurePosition(float position, float variance);
+    // A measured velocity more than two standard deviations from the estimate
+    // says the velocity changed more than the model allowed: its uncertainty
+    // widens until the measurement is explained, so that a car speeding up is
+    // followed while a steady one is smoothed hard.
     void measureVelocity(float velocity, float variance);
 
     // Moves the position estimate by a displacement the prediction missed.
@@ -30,9 +34,6 @@ public:
     // How far a measured velocity is from the estimate, in squared standard
     // deviations of the difference.
     float velocitySurprise(float velocity, float variance) const;
-    // Widens the velocity's uncertainty to take a measured velocity that the
-    // model did not expect (a turn, braking) as it comes.
-    void allowVelocityChange(float velocity);
 
     float position() const { return estimatedPosition; }
     float velocity() const { return estimatedVelocity; }
