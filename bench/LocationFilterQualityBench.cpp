@@ -38,7 +38,7 @@
 // to one side for twenty seconds, which a filter that follows the road's turns
 // follows too. Over five-minute straight drives it comes to 38 % (the unit
 // tests). With noise correlated over 5 s it gains less than with independent
-// noise (49-88 % of raw), as no filter can tell such a wander from the road.
+// noise (28-88 % of raw), as no filter can tell such a wander from the road.
 #include <benchmark/benchmark.h>
 #include <httplib.h>
 #include <pal/Simulation.h>
