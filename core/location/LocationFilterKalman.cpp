@@ -12,49 +12,54 @@ const float kAltitudeNoiseFactor = 20.0f;
 // A receiver's accuracy is the radius within which the true position lies
 // with 68 % probability: 1.5 standard deviations of a round Gaussian error.
 const float kAccuracyPerSigma = 1.5f;
-// What a reported speed and bearing may be off by, in metres per second.
-const float kMotionNoise = 0.5f;
+// What a reported speed may be off by (metres per second), and a reported
+// bearing (radians, about 5 degrees).
+const float kSpeedNoise = 0.5f;
+const float kBearingNoise = 0.09f;
+// How much the velocity drifts between reports, as the spectral density of a
+// white acceleration (metres squared per second cubed): little, so that a
+// steady drive is smoothed hard. A car speeding up or braking reports it, and
+// the velocity's uncertainty widens to follow (KalmanAxis::measureVelocity);
+// a turn or a stop passes the velocity gate below.
+const float kAccelerationDensity = 0.001f;
+// How fast a receiver that has not said how it moves may be going (metres per
+// second): fast enough that its first fixes are followed, not held.
+const float kUnknownSpeed = 30.0f;
+// A reported velocity this far from the estimate (squared standard
+// deviations over both axes: a chance below 1 % for noise) is a turn, a stop
+// or a glitch.
+const float kVelocityGate = 9.0f;
+// A fix that claims perfect accuracy is taken as good to a centimetre, not
+// as exact: an exact one would leave no variance to divide by.
+const float kMinVariance = 1.0e-4f;
 
 bool isValid(const Location& location) {
     return location.accuracy >= 0.0f && location.precision != PrecisionNone;
 }
 
-// Column-vector products: the state lives in the first three rows, the
-// fourth dimension only keeps the matrices invertible.
-Vertex<3, float> times(const Matrix& a, const Vertex<3, float>& v) {
-    return Vertex<3, float>(a.m[0] * v.x + a.m[1] * v.y + a.m[2] * v.z,
-                            a.m[4] * v.x + a.m[5] * v.y + a.m[6] * v.z,
-                            a.m[8] * v.x + a.m[9] * v.y + a.m[10] * v.z);
+float atLeastMinimum(float variance) {
+    return variance > kMinVariance ? variance : kMinVariance;
 }
 
-Vertex<3, float> plus(const Vertex<3, float>& a, const Vertex<3, float>& b) {
-    return Vertex<3, float>(a.x + b.x, a.y + b.y, a.z + b.z);
+float positionVariance(const Location& fix) {
+    const float sigma = fix.accuracy / kAccuracyPerSigma;
+    return atLeastMinimum(sigma * sigma);
 }
 
-bool isFinite(const Vertex<3, float>& v) {
-    const float sum = v.x + v.y + v.z;
-    return sum - sum == 0.0f;
+// Per axis: the speed noise, and the bearing noise across the way, which
+// grows with the speed.
+float velocityVariance(const Location& fix) {
+    const float across = fix.speed * kBearingNoise;
+    return atLeastMinimum(kSpeedNoise * kSpeedNoise + across * across);
 }
 
-// World coordinates saturate at the int32 limits, as CoordConversion's do.
-KDint32 toWorld(double value) {
-    if (value >= 2147483647.0) {
-        return 0x7FFFFFFF;
+// The shorter way round, so that a fix across the date line is next door.
+float longitudeDifference(float from, float to) {
+    const float difference = to - from;
+    if (difference > 180.0f) {
+        return difference - 360.0f;
     }
-    if (value <= -2147483648.0) {
-        return -0x7FFFFFFF - 1;
-    }
-    return static_cast<KDint32>(value);
-}
-
-// A variance of at least one world unit squared keeps the gain invertible
-// for fixes that claim perfect accuracy.
-float atLeastOne(float variance) {
-    return variance > 1.0f ? variance : 1.0f;
-}
-
-Matrix diagonal(float a, float b, float c, float d) {
-    return Matrix(a, 0, 0, 0, 0, b, 0, 0, 0, 0, c, 0, 0, 0, 0, d);
+    return difference < -180.0f ? difference + 360.0f : difference;
 }
 
 }  // namespace
@@ -64,114 +69,123 @@ LocationFilterKalman::LocationFilterKalman() {
 }
 
 void LocationFilterKalman::reset() {
-    originX = 0;
-    originY = 0;
-    // Without this the next fix would be taken as a measurement relative to
-    // origin (0, 0) and the estimate would crawl in from the world's corner.
-    lastAccepted = Location();
-    lastAccepted.x = -1;
-    lastAccepted.y = -1;
-    estimate = Vector();
-    F = Matrix::IDENTITY;
-    H = Matrix::IDENTITY;
-    P = Matrix::IDENTITY;
-    B = Matrix::IDENTITY;
-    Q = Matrix();
-    R = Matrix::IDENTITY;
+    lastAccepted = LocationFilterComplex::droppedFix();
+    east = KalmanAxis();
+    north = KalmanAxis();
+    hasHeldVelocity = false;
+    heldEast = 0.0f;
+    heldNorth = 0.0f;
+    altitude = -1.0f;
+    altitudeVariance = 0.0f;
 }
 
 Location LocationFilterKalman::filter(const Location& location) {
     if (!isValid(location)) {
         return LocationFilterComplex::droppedFix();
     }
-    // A speed glitch would push the prediction far ahead; the fix's
-    // displacement tells how it really moved.
-    const Location fix =
-        isValid(lastAccepted) ? Motion::withBelievableMotion(lastAccepted, location) : location;
-    if (!isValid(lastAccepted)) {
-        originX = fix.x;
-        originY = fix.y;
-        start(fix);
+    if (!isValid(lastAccepted) || secondsSinceLast(location) > kMaxPredictSeconds) {
+        start(location);
     } else {
-        update(fix, measurementOf(fix));
+        update(location);
     }
-    // A degenerate fix (zero accuracy standing still) can make the gain
-    // singular; start again from this fix rather than hand out NaN.
-    if (!isFinite(estimate)) {
-        originX = fix.x;
-        originY = fix.y;
-        start(fix);
+    // Positions or speeds that are not numbers would spread to the estimate;
+    // start again from this fix rather than hand it out.
+    if (!isFinite()) {
+        start(location);
     }
-    lastAccepted = fix;
+    lastAccepted = location;
     return adjustLocation(location);
 }
 
-LocationFilterKalman::Vector LocationFilterKalman::measurementOf(const Location& fix) const {
-    return Vector(static_cast<float>(static_cast<double>(fix.x) - originX),
-                  static_cast<float>(static_cast<double>(fix.y) - originY), fix.altitude);
-}
-
-// The first fix is known as well as its accuracy says, not better: the
-// covariance starts from its measurement noise.
+// The first fix is known as well as its accuracy says, not better; so is its
+// velocity, or hardly at all when it reports none.
 void LocationFilterKalman::start(const Location& fix) {
-    R = measurementNoise(fix);
-    const Matrix inverseH = H.getInverse();
-    estimate = times(inverseH, measurementOf(fix));
-    P = inverseH * R * H.getTranspose().getInverse();
+    const float position = positionVariance(fix);
+    float velocityEast = 0.0f;
+    float velocityNorth = 0.0f;
+    const bool known = Motion::velocity(fix, velocityEast, velocityNorth);
+    const float velocity = known ? velocityVariance(fix) : kUnknownSpeed * kUnknownSpeed;
+    east.start(0.0f, position, velocityEast, velocity);
+    north.start(0.0f, position, velocityNorth, velocity);
+    hasHeldVelocity = false;
+    altitude = -1.0f;
+    updateAltitude(fix);
 }
 
-// Noise as variances in world units squared, from the fix's accuracy; the
-// altitude keeps its own, coarser model.
-Matrix LocationFilterKalman::measurementNoise(const Location& fix) const {
-    int sigma = 0;
-    CoordConversion::MtoXY(fix.latitude, fix.accuracy / kAccuracyPerSigma, sigma);
-    const float variance = atLeastOne(static_cast<float>(sigma) * static_cast<float>(sigma));
-    return diagonal(variance, variance, fix.accuracy * kAltitudeNoiseFactor, 1.0f);
-}
-
-void LocationFilterKalman::update(const Location& fix, const Vector& measurement) {
-    const Step step = stepSinceLast(fix);
-    R = measurementNoise(fix);
-    const float variance = step.uncertainty * step.uncertainty;
-    const Vector previous = measurementOf(lastAccepted);
-    Q = diagonal(variance, variance, kdFabsf(measurement.z - previous.z), 1.0f);
-
-    const Vector predicted = plus(times(F, estimate), times(B, step.displacement));
-    const Matrix predictedP = F * P * F.getTranspose() + Q;
-    const Matrix gain = predictedP * H.getTranspose() * (H * predictedP * H.getTranspose() + R).getInverse();
-    const Vector innovation = measurement - times(H, predicted);
-    estimate = plus(predicted, times(gain, innovation));
-    P = predictedP - gain * H * predictedP;
-}
-
-// The prediction moves the estimate by the mean of the velocities the two
-// fixes report (a turn between them is shared by both courses); its
-// uncertainty grows with the receiver's speed and bearing noise and with the
-// change of velocity between the fixes, or, when the fix says nothing about
-// where it goes, with the distance it could have covered.
-LocationFilterKalman::Step LocationFilterKalman::stepSinceLast(const Location& fix) const {
+void LocationFilterKalman::update(const Location& fix) {
     const float seconds = secondsSinceLast(fix);
-    int noise = 0;
-    CoordConversion::vMtovXY(fix.latitude, kMotionNoise, noise);
-    float vx, vy, lastVx, lastVy;
-    const bool known = Motion::velocityXY(fix, vx, vy);
-    const bool lastKnown = Motion::velocityXY(lastAccepted, lastVx, lastVy);
-    float change;
-    Step step;
-    if (known && lastKnown) {
-        step.displacement = Vector(0.5f * (vx + lastVx) * seconds, 0.5f * (vy + lastVy) * seconds, 0.0f);
-        change = 0.5f * kdSqrtf((vx - lastVx) * (vx - lastVx) + (vy - lastVy) * (vy - lastVy));
-    } else if (known) {
-        step.displacement = Vector(vx * seconds, vy * seconds, 0.0f);
-        change = kdSqrtf(vx * vx + vy * vy);
-    } else {
-        int reach = 0;
-        CoordConversion::vMtovXY(fix.latitude,
-                                 fix.speed > Motion::kWalkingPace ? fix.speed : Motion::kWalkingPace, reach);
-        change = static_cast<float>(reach);
+    moveOriginTo(fix);
+    east.predict(seconds, kAccelerationDensity);
+    north.predict(seconds, kAccelerationDensity);
+    measureVelocity(fix, seconds);
+    // The fix is where the origin now is.
+    const float variance = positionVariance(fix);
+    east.measurePosition(0.0f, variance);
+    north.measurePosition(0.0f, variance);
+    updateAltitude(fix);
+}
+
+// From the last fix to this one: fixes at most kMaxPredictSeconds apart are
+// near enough for a flat map.
+void LocationFilterKalman::moveOriginTo(const Location& fix) {
+    float latitudePerMetre, longitudePerMetre;
+    Motion::degreesPerMetre(fix.latitude, latitudePerMetre, longitudePerMetre);
+    east.shift(-longitudeDifference(lastAccepted.longitude, fix.longitude) / longitudePerMetre);
+    north.shift(-(fix.latitude - lastAccepted.latitude) / latitudePerMetre);
+}
+
+// A velocity far from the estimate is taken when the next fix reports much the
+// same: the receiver turned or stopped at the fix that first reported it, so
+// the estimate moves as it would have had it known then.
+void LocationFilterKalman::measureVelocity(const Location& fix, float seconds) {
+    float velocityEast, velocityNorth;
+    if (!Motion::velocity(fix, velocityEast, velocityNorth)) {
+        hasHeldVelocity = false;
+        return;
     }
-    step.uncertainty = (static_cast<float>(noise) + change) * seconds;
-    return step;
+    const float variance = velocityVariance(fix);
+    const float surprise =
+        east.velocitySurprise(velocityEast, variance) + north.velocitySurprise(velocityNorth, variance);
+    if (surprise > kVelocityGate) {
+        const float dEast = velocityEast - heldEast;
+        const float dNorth = velocityNorth - heldNorth;
+        const bool confirmed =
+            hasHeldVelocity && (dEast * dEast + dNorth * dNorth) / (2.0f * variance) <= kVelocityGate;
+        if (!confirmed) {
+            hasHeldVelocity = true;
+            heldEast = velocityEast;
+            heldNorth = velocityNorth;
+            return;
+        }
+        east.shift((heldEast - east.velocity()) * seconds);
+        north.shift((heldNorth - north.velocity()) * seconds);
+    }
+    hasHeldVelocity = false;
+    east.measureVelocity(velocityEast, variance);
+    north.measureVelocity(velocityNorth, variance);
+}
+
+// The altitude follows its own coarser model: its uncertainty grows by the
+// change of the measured altitude. A missing altitude (-1) measures nothing.
+void LocationFilterKalman::updateAltitude(const Location& fix) {
+    if (fix.altitude == -1.0f) {
+        return;
+    }
+    const float noise = atLeastMinimum(fix.accuracy * kAltitudeNoiseFactor);
+    if (altitude == -1.0f) {
+        altitude = fix.altitude;
+        altitudeVariance = noise;
+        return;
+    }
+    altitudeVariance += kdFabsf(fix.altitude - lastAccepted.altitude);
+    const float gain = altitudeVariance / (altitudeVariance + noise);
+    altitude += gain * (fix.altitude - altitude);
+    altitudeVariance -= gain * altitudeVariance;
+}
+
+bool LocationFilterKalman::isFinite() const {
+    const float sum = east.position() + north.position() + east.velocity() + north.velocity() + altitude;
+    return sum - sum == 0.0f;
 }
 
 // The fixes' own time stamps (milliseconds) when both carry one, else the
@@ -183,22 +197,14 @@ float LocationFilterKalman::secondsSinceLast(const Location& fix) const {
     return Motion::secondsBetween(lastAccepted, fix);
 }
 
-// Latitude and longitude move from the fix's own by the estimate's offset
-// from it: a round trip of the whole position through single-precision world
-// coordinates would add a metre or more of rounding.
 Location LocationFilterKalman::adjustLocation(const Location& fix) const {
-    Location adjusted = fix;
-    adjusted.x = toWorld(static_cast<double>(originX) + estimate.x);
-    adjusted.y = toWorld(static_cast<double>(originY) + estimate.y);
-    const Vector offset = estimate - measurementOf(fix);
-    float metresPerUnit = 0.0f;
-    CoordConversion::XYtoM(fix.latitude, 1000000, metresPerUnit);
-    metresPerUnit /= 1.0e6f;
     float latitudePerMetre, longitudePerMetre;
     Motion::degreesPerMetre(fix.latitude, latitudePerMetre, longitudePerMetre);
-    adjusted.latitude = Motion::clampLatitude(fix.latitude - offset.y * metresPerUnit * latitudePerMetre);
-    adjusted.longitude = fix.longitude + offset.x * metresPerUnit * longitudePerMetre;
-    adjusted.altitude = estimate.z;
+    Location adjusted = fix;
+    adjusted.latitude = Motion::clampLatitude(fix.latitude + north.position() * latitudePerMetre);
+    adjusted.longitude = longitudeDifference(0.0f, fix.longitude + east.position() * longitudePerMetre);
+    adjusted.altitude = altitude;
+    CoordConversion::toXY(adjusted.latitude, adjusted.longitude, adjusted.x, adjusted.y);
     return adjusted;
 }
 

@@ -41,16 +41,21 @@ public:
     // as a share of the raw fixes' on synthetic tracks (LocationFilterQualityBench):
     //
     //   track                         raw     Chain (default)   Kalman
-    //   standing, 20 m accuracy       7.1 m        76 %           22 %
-    //   walking                       5.7 m        57 %           31 %
-    //   driving with turns            4.1 m        62 %           50 %
-    //   walking with 150 m outliers  13.3 m        24 %           25 %
-    //   long stop, then driving on    4.1 m        63 %           38 %
-    //   speed spike while driving     4.4 m        64 %           48 %
+    //   standing, 20 m accuracy       7.1 m        76 %           19 %
+    //   walking                       5.7 m        55 %           22 %
+    //   walking, noisier receiver     8.6 m        58 %           27 %
+    //   driving with turns            4.1 m        62 %           40 %
+    //   walking with 150 m outliers  13.3 m        23 %           20 %
+    //   long stop, then driving on    4.1 m        63 %           26 %
+    //   speed spike while driving     4.4 m        64 %           40 %
+    //   stop and go traffic           4.2 m        59 %           33 %
+    //   receiver clock steps back     4.2 m        59 %           35 %
     //
-    // The chain holds a standing position still and keeps the behaviour
-    // applications know; the Kalman filter is closer to the truth on nearly
-    // every track but lets the marker drift by a metre or two while standing.
+    // Neither moves the marker back along the way by more than 5 m on these
+    // tracks. The chain holds a standing position still and keeps the
+    // behaviour applications know; the Kalman filter is closer to the truth
+    // on every track but lets the marker drift by a metre or two while
+    // standing.
     void setSmoother(LocationSmoother::Kind kind);
     LocationSmoother::Kind getSmoother() const;
 

@@ -1,6 +1,8 @@
 #include <gtest/gtest.h>
 
+#include <cmath>
 #include <limits>
+#include <random>
 
 #include "location/LocationFilterAverage.h"
 #include "location/LocationFilterAverageCourse.h"
@@ -25,6 +27,81 @@ const KDust kSecond = 1000000000ull;
 // Deterministic jitter within +-5 m.
 float jitter(int i, int salt) {
     return static_cast<float>((i * 37 + salt * 11) % 11) - 5.0f;
+}
+
+// Gaussian noise from the fully specified Mersenne Twister (Box-Muller), so
+// a seed gives the same track with every standard library.
+class Noise {
+public:
+    explicit Noise(unsigned seed) : random(seed) {}
+    float gauss(float sigma) {
+        const double u1 = (static_cast<double>(random()) + 1.0) / 4294967296.0;
+        const double u2 = static_cast<double>(random()) / 4294967296.0;
+        return static_cast<float>(sigma * std::sqrt(-2.0 * std::log(u1)) * std::cos(6.283185307179586 * u2));
+    }
+
+private:
+    std::mt19937 random;
+};
+
+// Metres north and east from (kLat, kLon) of a filtered position.
+void offsetOf(const Location::Location& fix, float& north, float& east) {
+    north = (fix.latitude - kLat) * location_test::kMetresPerDegreeLatitude;
+    east = (fix.longitude - kLon) * location_test::kMetresPerDegreeLatitude * kdCosf(kLat * 0.017453292f);
+}
+
+// A receiver moving along `course` at `speed`: its true position and its
+// fixes, noisy by `sigma` metres per axis, with speed and bearing noise.
+struct NoisyTrack {
+    std::vector<float> trueNorth, trueEast;
+    std::vector<Location::Location> fixes;
+};
+
+NoisyTrack noisyStraightTrack(unsigned seed, int seconds, float speed, float course, float sigma,
+                              float accuracy, float speedSigma, float bearingSigma) {
+    Noise noise(seed);
+    NoisyTrack track;
+    const float radians = course * 0.017453292f;
+    for (int i = 0; i < seconds; ++i) {
+        const float north = speed * i * kdCosf(radians);
+        const float east = speed * i * kdSinf(radians);
+        const float reportedSpeed = std::max(0.0f, speed + noise.gauss(speedSigma));
+        const float bearing = std::fmod(course + noise.gauss(bearingSigma) + 360.0f, 360.0f);
+        Location::Location fix =
+            location_test::fixNear(kLat, kLon, north + noise.gauss(sigma), east + noise.gauss(sigma),
+                                   accuracy, (i + 1) * kSecond, reportedSpeed, bearing);
+        fix.fixTime = 1000 * (i + 1);
+        track.trueNorth.push_back(north);
+        track.trueEast.push_back(east);
+        track.fixes.push_back(fix);
+    }
+    return track;
+}
+
+float rmsError(const NoisyTrack& track, const std::vector<Location::Location>& shown) {
+    float sum = 0.0f;
+    for (size_t i = 0; i < shown.size(); ++i) {
+        float north, east;
+        offsetOf(shown[i], north, east);
+        sum += (north - track.trueNorth[i]) * (north - track.trueNorth[i]) +
+               (east - track.trueEast[i]) * (east - track.trueEast[i]);
+    }
+    return std::sqrt(sum / static_cast<float>(shown.size()));
+}
+
+// How far the shown position ever went back along `course` from one fix to
+// the next.
+float largestStepBack(const std::vector<Location::Location>& shown, float course) {
+    const float radians = course * 0.017453292f;
+    float largest = 0.0f;
+    for (size_t i = 1; i < shown.size(); ++i) {
+        float north0, east0, north1, east1;
+        offsetOf(shown[i - 1], north0, east0);
+        offsetOf(shown[i], north1, east1);
+        const float along = (east1 - east0) * kdSinf(radians) + (north1 - north0) * kdCosf(radians);
+        largest = std::max(largest, -along);
+    }
+    return largest;
 }
 
 class LocationFilterTest : public PalTest {
@@ -368,6 +445,68 @@ TEST_F(LocationFilterTest, MissingAltitudeIsLeftOutOfTheAverage) {
         out = average.filter(unknown);
     }
     EXPECT_EQ(-1.0f, out.altitude);
+}
+
+// A receiver whose speed and bearing are as noisy as its position: a filter
+// that predicts straight from the reported velocities keeps their noise, one
+// that estimates the velocity averages it out over the drive. Five-minute
+// drives, so that the first fixes, which no filter can do much about, count
+// for little.
+TEST_F(LocationFilterTest, KalmanOnNoisyDrivesStaysWellWithinTheRawError) {
+    float rawSquares = 0.0f;
+    float filteredSquares = 0.0f;
+    for (unsigned seed = 1; seed <= 5; ++seed) {
+        const NoisyTrack track = noisyStraightTrack(seed, 300, 14.0f, 70.0f, 3.0f, 8.0f, 0.5f, 3.0f);
+        Location::LocationFilterKalman kalman;
+        std::vector<Fix> shown;
+        for (const Fix& fix : track.fixes) {
+            shown.push_back(kalman.filter(fix));
+        }
+        const float raw = rmsError(track, track.fixes);
+        const float filtered = rmsError(track, shown);
+        rawSquares += raw * raw;
+        filteredSquares += filtered * filtered;
+        EXPECT_LT(filtered, 0.5f * raw) << "seed " << seed;
+        EXPECT_LT(largestStepBack(shown, 70.0f), 1.0f) << "seed " << seed;
+    }
+    EXPECT_LT(std::sqrt(filteredSquares), 0.42f * std::sqrt(rawSquares));
+}
+
+// Noiseless fixes: east at 14 m/s, a turn north, one fix whose speed drops to
+// zero while its position goes on, then a real stop.
+TEST_F(LocationFilterTest, KalmanFollowsTurnsAndStopsButNotAOneFixSpeedGlitch) {
+    Location::LocationFilterKalman kalman;
+    float north = 0.0f;
+    float east = 0.0f;
+    for (int i = 0; i < 60; ++i) {
+        const bool stopped = i >= 50;
+        const float bearing = i < 20 ? 90.0f : 0.0f;
+        const float speed = stopped || i == 35 ? 0.0f : 14.0f;
+        Fix reported = fix(north, east, i + 1, speed, stopped ? -1.0f : bearing, 8.0f);
+        reported.fixTime = 1000 * (i + 1);
+        EXPECT_LT(metresBetween(reported, kalman.filter(reported)), 1.5f) << "fix " << i;
+        if (!stopped) {
+            north += bearing == 0.0f ? 14.0f : 0.0f;
+            east += bearing == 90.0f ? 14.0f : 0.0f;
+        }
+    }
+}
+
+// Walking with fixes noisier than their accuracy says: the mean of three can
+// fall metres behind the last one shown, and the chain must not show it.
+TEST_F(LocationFilterTest, ChainNeverStepsBackAlongTheWayOfANoisyWalk) {
+    for (unsigned seed = 1; seed <= 8; ++seed) {
+        const NoisyTrack track = noisyStraightTrack(seed, 120, 1.4f, 20.0f, 6.0f, 10.0f, 0.3f, 12.0f);
+        Location::LocationFilterAverage chain;
+        std::vector<Fix> shown;
+        // A dropped fix leaves the last position shown.
+        for (const Fix& fix : track.fixes) {
+            const Fix out = chain.filter(fix);
+            shown.push_back(out.accuracy >= 0.0f || shown.empty() ? out : shown.back());
+        }
+        EXPECT_LT(largestStepBack(shown, 20.0f), 3.0f) << "seed " << seed;
+        EXPECT_LT(rmsError(track, shown), rmsError(track, track.fixes)) << "seed " << seed;
+    }
 }
 
 }  // namespace

@@ -222,10 +222,12 @@ TEST_F(LocationManagerTest, SmootherSwitchesWhileRunningWithoutAJump) {
             deliver(fixAt(i % 2 == 0 ? -4.0f : 4.0f, 20.0f, -1.0f, -1.0f));
         }
         ASSERT_EQ(before + 10, heard.locations.size());
+        // A fifth of the 6 m between the two at most, and the jitter the
+        // filters let through; a jump would be the whole 6 m.
         float moved = 0.0f;
         for (size_t i = before; i < heard.locations.size(); ++i) {
             const float step = location_test::metresBetween(heard.locations[i - 1], heard.locations[i]);
-            EXPECT_LT(step, 1.5f) << i;
+            EXPECT_LT(step, 2.0f) << i;
             moved += step;
         }
         // It did go over to the other filter's position.

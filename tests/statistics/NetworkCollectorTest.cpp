@@ -66,10 +66,8 @@ protected:
         pal::postAppResumed();
         pump();
         server.reset(new TestHttpServer());
-        TestHttpServer::Reply ok;
-        ok.body = "ok";
-        server->on("/wifipool/2.x/", ok);
-        server->on("/tile", ok);
+        server->on("/wifipool/2.x/", okReply());
+        server->on("/tile", okReply());
         pal::scriptSignalStrength(pal::Answer::after(0), false, 0);
         pal::scriptWifiScan(pal::Answer::after(0), {{"00:11:22:33:44:55", "net", -50}});
         collector.reset(new NetworkCollector());
@@ -119,19 +117,51 @@ protected:
         return countLogLines("WifiPoolChunk::addNetworkSpeedInfoToChunk()[requests.size()");
     }
 
-    // Waits for the network while an upload is open.
-    bool awaitUploads(std::size_t count) {
-        while (server->requestCount() < count) {
-            if (NetworkManager::getInstance()->getNetworkActivityStatus() != NetworkManager::NetworkActive) {
-                pump();
-                if (NetworkManager::getInstance()->getNetworkActivityStatus() !=
-                    NetworkManager::NetworkActive) {
-                    return server->requestCount() >= count;
-                }
-            }
+    // Waits until the exchanges in flight have ended, on the collector's side
+    // too: the server has an upload before its answer reaches the collector.
+    void awaitIdle() {
+        while (NetworkManager::getInstance()->getNetworkActivityStatus() == NetworkManager::NetworkActive) {
             kdWaitEvent(static_cast<KDust>(-1));
         }
-        return true;
+        pump();
+    }
+
+    // Waits for the uploads in flight; true when the server had count of them.
+    bool awaitUploads(std::size_t count) {
+        awaitIdle();
+        return server->requestCount() >= count;
+    }
+
+    static TestHttpServer::Reply okReply() {
+        TestHttpServer::Reply ok;
+        ok.body = "ok";
+        return ok;
+    }
+
+    // Answers once released, and then breaks off the answer.
+    static TestHttpServer::Reply dropAfterStall() {
+        TestHttpServer::Reply reply;
+        reply.mode = TestHttpServer::Reply::DropAfterStall;
+        reply.body = std::string(64, 'x');
+        return reply;
+    }
+
+    // Tasks the network manager holds, queued or running; the location
+    // manager's positioning request, waiting for a startup answer, among them.
+    static int tasksHeld() {
+        Network::NetworkManagerImpl* manager =
+            static_cast<Network::NetworkManagerImpl*>(NetworkManager::getInstance());
+        return manager->getUnreadyCount() + manager->getTaskCount();
+    }
+
+    // The upload on its way to a server scripted with dropAfterStall() fails
+    // while the platform reports no network, whichever comes first: the
+    // request reaching the server or the release.
+    void cutOffTheUploadInFlight() {
+        pal::setReachability(KD_NETWORK_NOT_REACHABLE_ZVR);
+        pump();
+        server->releaseStalls();
+        awaitIdle();
     }
 
     Decoded decode(const TestHttpServer::Received& upload) {
@@ -308,42 +338,110 @@ TEST_F(NetworkCollectorTest, MeasuresRequestsOnlyWhileStartedAndNotPaused) {
     EXPECT_EQ(0, collector->getNetworkSpeedCollector()->getRecordCount());
 }
 
-// An upload that found the network offline waits for offline mode to end and
-// belongs to its collector meanwhile: stop() withdraws it, and once the
-// collector is gone nothing of it runs.
-TEST_F(NetworkCollectorTest, UploadFinishedOfflineIsWithdrawnByStopAndNeverRunsAfterTheCollectorWentAway) {
+// The network drops while an upload is on its way: the upload finishes with
+// the offline code and the network manager queues it until the application
+// ends offline mode.
+TEST_F(NetworkCollectorTest, UploadCutOffByTheNetworkWaitsAloneAndGoesOutOnceWhenOfflineModeEnds) {
+    server->on("/wifipool/2.x/", dropAfterStall());
     collector->start();
-    runSeconds(100);
-    pal::setReachability(KD_NETWORK_NOT_REACHABLE_ZVR);
-    runSeconds(21);
+    runSeconds(119);
+    const int othersHeld = tasksHeld();
+    runSeconds(1);
+    cutOffTheUploadInFlight();
+    ASSERT_EQ(NetworkManager::OfflineModeOn, NetworkManager::getInstance()->getOfflineModeStatus());
+
+    // The network is back, offline mode not yet: later periods add no body.
+    pal::setReachability(KD_NETWORK_REACHABLE_VIA_WIFI_ZVR);
+    runSeconds(240);
+    EXPECT_EQ(2, countLogLines("NetworkCollector::onSendTimerFired()[upload pending]"));
+    EXPECT_EQ(othersHeld + 1, tasksHeld());
+
+    server->on("/wifipool/2.x/", okReply());
+    NetworkManager::getInstance()->changeOfflineModeStatus(NetworkManager::OfflineModeOff);
+    ASSERT_TRUE(awaitUploads(2));
+    runSeconds(120);
+    ASSERT_TRUE(awaitUploads(3));
+
+    std::vector<TestHttpServer::Received> uploads = server->received();
+    ASSERT_EQ(3u, uploads.size());
+    EXPECT_EQ(uploads[0].part("data")->content, uploads[1].part("data")->content);
+    EXPECT_EQ("normal normal normal", decode(uploads[1]).types);
+    EXPECT_EQ(
+        "normal disconnected error connected normal normal normal normal normal normal normal normal "
+        "normal normal normal",
+        decode(uploads[2]).types);
+}
+
+// ... and belongs to its collector meanwhile: stop() withdraws it, and once
+// the collector is gone nothing of it runs.
+TEST_F(NetworkCollectorTest, UploadCutOffByTheNetworkIsWithdrawnByStopAndNeverRunsAfterTheCollectorWentAway) {
+    server->on("/wifipool/2.x/", dropAfterStall());
+    collector->start();
+    runSeconds(119);
+    const int othersHeld = tasksHeld();
+    runSeconds(1);
+    cutOffTheUploadInFlight();
     ASSERT_EQ(NetworkManager::OfflineModeOn, NetworkManager::getInstance()->getOfflineModeStatus());
 
     collector->stop();
     collector.reset();
+    server->on("/wifipool/2.x/", okReply());
     pal::setReachability(KD_NETWORK_REACHABLE_VIA_WIFI_ZVR);
     NetworkManager::getInstance()->changeOfflineModeStatus(NetworkManager::OfflineModeOff);
     runSeconds(5);
 
-    EXPECT_EQ(0, static_cast<Network::NetworkManagerImpl*>(NetworkManager::getInstance())->getTaskCount());
-    EXPECT_EQ(0u, server->requestCount());
+    EXPECT_EQ(othersHeld, tasksHeld());
+    EXPECT_EQ(1u, server->requestCount());
 }
 
-TEST_F(NetworkCollectorTest, UploadFinishedOfflineGoesOutOnceWhenOfflineModeEnds) {
+TEST_F(NetworkCollectorTest, UploadAwaitingItsAnswerHoldsBackTheNextOne) {
+    TestHttpServer::Reply stall = okReply();
+    stall.mode = TestHttpServer::Reply::StallBeforeReply;
+    server->on("/wifipool/2.x/", stall);
+    collector->start();
+    runSeconds(240);
+    EXPECT_TRUE(hasLogLine("NetworkCollector::onSendTimerFired()[upload pending]"));
+    server->on("/wifipool/2.x/", okReply());
+    server->releaseStalls();
+    awaitIdle();
+    runSeconds(120);
+    ASSERT_TRUE(awaitUploads(2));
+
+    EXPECT_EQ(2u, server->requestCount());
+    EXPECT_EQ("normal normal normal", decode(server->received()[0]).types);
+    EXPECT_EQ("normal normal normal normal normal normal normal normal", decode(server->received()[1]).types);
+}
+
+// Before, every send period of the hour queued one more body behind the
+// first upload's offline failure, and offline mode stayed on after the
+// network returned, so none was sent.
+TEST_F(NetworkCollectorTest, AnHourOfflineQueuesNoBodyAndEveryChunkArrivesOnceWhenTheNetworkReturns) {
     collector->start();
     runSeconds(100);
+    const int othersHeld = tasksHeld();
     pal::setReachability(KD_NETWORK_NOT_REACHABLE_ZVR);
-    runSeconds(21);
-    ASSERT_EQ(NetworkManager::OfflineModeOn, NetworkManager::getInstance()->getOfflineModeStatus());
+    pump();
+    runSeconds(3600);
+    EXPECT_EQ(NetworkManager::OfflineModeOff, NetworkManager::getInstance()->getOfflineModeStatus());
+    EXPECT_LE(tasksHeld(), othersHeld + 1);
+    EXPECT_EQ(30, countLogLines("NetworkCollector::onSendTimerFired()[not reachable]"));
 
     pal::setReachability(KD_NETWORK_REACHABLE_VIA_WIFI_ZVR);
-    NetworkManager::getInstance()->changeOfflineModeStatus(NetworkManager::OfflineModeOff);
+    pump();
+    runSeconds(20);
     ASSERT_TRUE(awaitUploads(1));
-    runSeconds(5);
+    runSeconds(120);
+    ASSERT_TRUE(awaitUploads(2));
 
-    EXPECT_EQ(1u, server->requestCount());
-    Decoded decoded = decode(server->received()[0]);
-    ASSERT_TRUE(decoded.ok);
-    EXPECT_EQ("normal normal normal disconnected", decoded.types);
+    EXPECT_EQ(2u, server->requestCount());
+    std::string expected = "normal normal normal disconnected";
+    for (int i = 0; i < 120; ++i) {
+        expected += " normal";
+    }
+    EXPECT_EQ(expected + " connected", decode(server->received()[0]).types);
+    EXPECT_EQ("normal normal normal normal", decode(server->received()[1]).types);
+    // All but the one started with the last upload's tick.
+    EXPECT_EQ(125 + 4 + 1, chunksMade());
 }
 
 }  // namespace

@@ -129,7 +129,8 @@ void TestHttpServer::Impl::handle(const httplib::Request& request, httplib::Resp
     if (reply.delayMs > 0) {
         std::this_thread::sleep_for(std::chrono::milliseconds(reply.delayMs));
     }
-    if (reply.mode == Reply::StallBeforeReply && !waitForRelease()) {
+    const bool stalls = reply.mode == Reply::StallBeforeReply || reply.mode == Reply::DropAfterStall;
+    if (stalls && !waitForRelease()) {
         return;
     }
     answer(reply, request, response);
@@ -213,6 +214,7 @@ void TestHttpServer::Impl::answer(const Reply& reply, const httplib::Request& re
             break;
         }
         case Reply::DropMidBody:
+        case Reply::DropAfterStall:
             // Returning false from the provider makes the server close the
             // connection short of the announced length.
             response.set_content_provider(body.size(), contentType,

@@ -26,6 +26,7 @@ public:
             DropMidBody,       // announces the body's length, sends half of it, closes
             StallBeforeReply,  // answers nothing until releaseStalls()
             StallMidBody,      // sends the headers and half the body, then waits as above
+            DropAfterStall,    // waits as StallBeforeReply, then answers as DropMidBody
             Echo,              // the request body back, with the request's Content-Type
             Repeated           // the body chunked, repeatCount times over, or until the client leaves
         };

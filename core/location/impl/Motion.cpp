@@ -66,6 +66,10 @@ bool isMoving(const Location& fix) {
     return hasSpeed(fix) && fix.speed >= kWalkingPace && hasBearing(fix);
 }
 
+bool reportsDirection(const Location& fix) {
+    return hasSpeed(fix) && fix.speed > 0.0f && hasBearing(fix);
+}
+
 // From the meridian and prime-vertical radii of curvature.
 void degreesPerMetre(float latitude, float& latitudeDegrees, float& longitudeDegrees) {
     const float absolute = kdFabsf(latitude);

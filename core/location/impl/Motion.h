@@ -21,6 +21,9 @@ bool velocityXY(const Location& fix, float& vx, float& vy);
 
 // True when the fix reports moving at walking pace or faster along a bearing.
 bool isMoving(const Location& fix);
+// True when the fix reports a bearing and a speed above zero: it says which
+// way it goes, however slowly.
+bool reportsDirection(const Location& fix);
 
 // Degrees of latitude and longitude per metre north and east at a latitude,
 // on the WGS 84 ellipsoid; for displacements of up to a few kilometres.

@@ -265,6 +265,20 @@ void NetworkCollector::onSendTimerFired() {
         Logger::log(Logger::Debug, "NetworkCollector::onSendTimerFired()[empty]");
         return;
     }
+    // One upload at a time: while one waits for its answer, or in the network
+    // manager's offline queue, the chunks made since join the next body.
+    if (!networkRequests.empty()) {
+        Logger::log(Logger::Debug, "NetworkCollector::onSendTimerFired()[upload pending]");
+        return;
+    }
+    // Started now, the upload would fail at once and switch the network
+    // manager into offline mode, which only the application ends; the chunks
+    // rather wait here for a period with a network.
+    if (Network::NetworkManager::getInstance()->getNetworkReachabilityStatus() ==
+        Network::NetworkManager::NetworkNotReachable) {
+        Logger::log(Logger::Debug, "NetworkCollector::onSendTimerFired()[not reachable]");
+        return;
+    }
     UrlBuilder builder(baseUrl);
     builder.setAdditionPath("wifipool/2.x/");
     root->appendParams(builder);
@@ -281,7 +295,8 @@ void NetworkCollector::onSendTimerFired() {
     boost::shared_ptr<NetworkCollectorRequest> request = boost::make_shared<NetworkCollectorRequest>(this);
     request->setLang(lang.c_str());
     request->submit(builder.buildString(), body);
-    // Sent chunks are gone whatever the upload's outcome.
+    // The chunks now live in the upload alone: a failed one loses them, one
+    // that finds the network offline waits in the network manager's queue.
     root->removeChildren();
 }
 

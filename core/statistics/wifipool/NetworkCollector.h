@@ -20,6 +20,10 @@ class WifiPoolChunk;
 // uploads the finished ones on a send timer as one gzip-compressed,
 // scrambled document. Owned by the thread that constructs it (which must
 // pump platform events); every call belongs there.
+//
+// At most one upload is pending at a time: a send period that finds one
+// still waiting (for its answer, or in the network manager's offline queue)
+// or the network unreachable keeps its chunks for the next period's body.
 class NetworkCollector : public Location::LocationListener {
 public:
     NetworkCollector();

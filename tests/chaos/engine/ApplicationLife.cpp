@@ -307,6 +307,7 @@ void ApplicationLife::drain() {
     int round = 0;
     for (; round < kDrainRounds && report.holds(); ++round) {
         settle();
+        endOfflineMode();
         if (manager->getTaskCount() + manager->getUnreadyCount() == 0) {
             break;
         }
@@ -333,11 +334,10 @@ void ApplicationLife::finishHeldTasks() {
     pal::setReachability(reachability);
     taskPool.readyAll();
     // Held-back tasks are looked at again when offline mode ends.
-    Network::NetworkManager* manager = Network::NetworkManager::getInstance();
-    manager->changeOfflineModeStatus(Network::NetworkManager::OfflineModeOn);
-    manager->changeOfflineModeStatus(Network::NetworkManager::OfflineModeOff);
+    Network::NetworkManager::getInstance()->changeOfflineModeStatus(Network::NetworkManager::OfflineModeOn);
     for (int round = 0; round < kDrainRounds && report.holds(); ++round) {
         settle();
+        endOfflineMode();
         if (taskPool.unfinishedCount() == 0) {
             return;
         }
@@ -347,6 +347,13 @@ void ApplicationLife::finishHeldTasks() {
         report.breach(std::to_string(taskPool.unfinishedCount()) + " held tasks never finished within " +
                       std::to_string(kDrainRounds) + " s with the network and the server back");
     }
+}
+
+// Only the application switches offline mode off, as one does that sees the
+// network back; a finish made offline and delivered late switches it on again.
+void ApplicationLife::endOfflineMode() {
+    Network::NetworkManager::getInstance()->changeOfflineModeStatus(Network::NetworkManager::OfflineModeOff);
+    kdPumpEvents();
 }
 
 void ApplicationLife::shutDown() {

@@ -23,14 +23,16 @@ class NetworkCollector;
 // against loopback servers, steered by a byte script. It starts the platform
 // layer, reads one step after another (an opcode, then its arguments) and
 // plays it: pause and resume, views shown and hidden (also from inside their
-// redraw callbacks), reachability and offline mode, network tasks, positioning
-// requests, the location manager, satellite fixes, the statistics collector,
-// the startup controller, server answers, re-entries from callbacks and time. After every step it
-// checks that nothing asserted unless the step misused the library on
-// purpose, that no task or request was heard from after its owner let it go,
-// and that live tasks and buffered bytes stay bounded. At the end it takes
-// everything down, waits for every queue to drain, shuts the platform layer
-// down and checks that nothing is left.
+// redraw callbacks), reachability and offline mode, network tasks,
+// positioning requests, the location manager, satellite fixes, the statistics
+// collector, the startup controller, server answers, re-entries from
+// callbacks and time. After every step it checks that nothing asserted unless
+// the step misused the library on purpose, that no task or request was heard
+// from after its owner let it go or after its final callback, and that live
+// tasks and buffered bytes stay bounded. At the end it brings the network, the
+// server and the application back and requires every task still held to
+// finish, takes everything down, waits for every queue to drain, shuts the
+// platform layer down and checks that nothing is left.
 //
 // Runs on the calling thread, which becomes the platform's main thread; one
 // life at a time per process.
@@ -66,6 +68,7 @@ private:
     void startApplication();
     void drain();
     void finishHeldTasks();
+    void endOfflineMode();
     void shutDown();
     void checkInvariants();
     void checkAssertions();
