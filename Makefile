@@ -25,7 +25,7 @@ FUZZ_SECONDS ?= 60
 # make cross-test ARCH=arm64|armhf: cross-build in build-cross-ARCH and run the tests under qemu.
 ARCH ?= arm64
 # make tsan-test: the areas whose code crosses threads, under ThreadSanitizer in build-tsan.
-TSAN_AREAS ?= pal tasking http network
+TSAN_AREAS ?= pal tasking http network statistics e2e chaos
 
 .PHONY: deps configure build test tsan-test demo bench fuzz-build fuzz fuzz-replay cross-test clean
 

@@ -17,10 +17,11 @@ const float kAccuracyPerSigma = 1.5f;
 const float kSpeedNoise = 0.5f;
 const float kBearingNoise = 0.09f;
 // How much the velocity drifts between reports, as the spectral density of a
-// white acceleration (metres squared per second cubed): enough to follow a car
-// speeding up or braking gently. A sharper change is a turn or a stop, which
-// the fixes report and the velocity gate lets through.
-const float kAccelerationDensity = 0.03f;
+// white acceleration (metres squared per second cubed): little, so that a
+// steady drive is smoothed hard. A car speeding up or braking reports it, and
+// the velocity's uncertainty widens to follow (KalmanAxis::measureVelocity);
+// a turn or a stop passes the velocity gate below.
+const float kAccelerationDensity = 0.001f;
 // How fast a receiver that has not said how it moves may be going (metres per
 // second): fast enough that its first fixes are followed, not held.
 const float kUnknownSpeed = 30.0f;
@@ -158,8 +159,6 @@ void LocationFilterKalman::measureVelocity(const Location& fix, float seconds) {
         }
         east.shift((heldEast - east.velocity()) * seconds);
         north.shift((heldNorth - north.velocity()) * seconds);
-        east.allowVelocityChange(velocityEast);
-        north.allowVelocityChange(velocityNorth);
     }
     hasHeldVelocity = false;
     east.measureVelocity(velocityEast, variance);

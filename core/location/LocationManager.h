@@ -42,14 +42,14 @@ public:
     //
     //   track                         raw     Chain (default)   Kalman
     //   standing, 20 m accuracy       7.1 m        76 %           19 %
-    //   walking                       5.7 m        55 %           26 %
+    //   walking                       5.7 m        55 %           22 %
     //   walking, noisier receiver     8.6 m        58 %           27 %
-    //   driving with turns            4.1 m        62 %           41 %
-    //   walking with 150 m outliers  13.3 m        23 %           21 %
-    //   long stop, then driving on    4.1 m        63 %           30 %
-    //   speed spike while driving     4.4 m        64 %           42 %
-    //   stop and go traffic           4.2 m        59 %           43 %
-    //   receiver clock steps back     4.2 m        59 %           39 %
+    //   driving with turns            4.1 m        62 %           40 %
+    //   walking with 150 m outliers  13.3 m        23 %           20 %
+    //   long stop, then driving on    4.1 m        63 %           26 %
+    //   speed spike while driving     4.4 m        64 %           40 %
+    //   stop and go traffic           4.2 m        59 %           33 %
+    //   receiver clock steps back     4.2 m        59 %           35 %
     //
     // Neither moves the marker back along the way by more than 5 m on these
     // tracks. The chain holds a standing position still and keeps the

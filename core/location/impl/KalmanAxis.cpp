@@ -2,6 +2,13 @@
 
 namespace Location {
 
+namespace {
+
+// Two standard deviations, squared.
+const float kWidenBeyond = 4.0f;
+
+}  // namespace
+
 KalmanAxis::KalmanAxis() : estimatedPosition(0.0f), estimatedVelocity(0.0f), pp(1.0f), pv(0.0f), vv(1.0f) {}
 
 void KalmanAxis::start(float position, float positionVariance, float velocity, float velocityVariance) {
@@ -39,17 +46,16 @@ float KalmanAxis::velocitySurprise(float velocity, float variance) const {
     return innovation * innovation / (vv + variance);
 }
 
-void KalmanAxis::allowVelocityChange(float velocity) {
-    const float innovation = velocity - estimatedVelocity;
-    vv += innovation * innovation;
-}
-
 // H = [0 1]: the gain is the second column of P over the innovation variance.
 void KalmanAxis::measureVelocity(float velocity, float variance) {
+    const float innovation = velocity - estimatedVelocity;
+    const float expected = vv + variance;
+    if (innovation * innovation > kWidenBeyond * expected) {
+        vv += innovation * innovation - expected;
+    }
     const float innovationVariance = vv + variance;
     const float gainPosition = pv / innovationVariance;
     const float gainVelocity = vv / innovationVariance;
-    const float innovation = velocity - estimatedVelocity;
     estimatedPosition += gainPosition * innovation;
     estimatedVelocity += gainVelocity * innovation;
     pp -= gainPosition * pv;

@@ -4,7 +4,7 @@ namespace Location {
 
 // One horizontal axis of a constant-velocity Kalman filter: a position, a
 // velocity and their 2x2 covariance, in any consistent units (the location
-// filter uses world units and world units per second). The axes of a position
+// filter uses metres and metres per second). The axes of a position
 // are filtered apart: keeping the cross-axis terms would cost a general
 // matrix for a correlation the receivers do not report. Any thread; no
 // shared state.
@@ -22,21 +22,22 @@ public:
     void predict(float seconds, float accelerationDensity);
 
     void measurePosition(float position, float variance);
+    // A measured velocity more than two standard deviations from the estimate
+    // says the velocity changed more than the model allowed: its uncertainty
+    // widens until the measurement is explained, so that a car speeding up is
+    // followed while a steady one is smoothed hard.
     void measureVelocity(float velocity, float variance);
 
-    // Moves the position estimate by a displacement the prediction missed.
+    // Moves the position estimate: to a new origin, or by a displacement the
+    // prediction missed.
     void shift(float displacement) { estimatedPosition += displacement; }
 
     // How far a measured velocity is from the estimate, in squared standard
     // deviations of the difference.
     float velocitySurprise(float velocity, float variance) const;
-    // Widens the velocity's uncertainty to take a measured velocity that the
-    // model did not expect (a turn, braking) as it comes.
-    void allowVelocityChange(float velocity);
 
     float position() const { return estimatedPosition; }
     float velocity() const { return estimatedVelocity; }
-    float positionVariance() const { return pp; }
 
 private:
     float estimatedPosition;
