@@ -28,6 +28,17 @@ Bytes readData(const std::string& name) {
     return Bytes(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
 }
 
+// baseline.jpg cut halfway through the scan that follows its start-of-scan marker.
+Bytes baselineCutHalfwayThroughItsScan() {
+    Bytes jpeg = readData("baseline.jpg");
+    size_t scan = 0;
+    while (scan + 1 < jpeg.size() && !(jpeg[scan] == 0xFF && jpeg[scan + 1] == 0xDA)) {
+        ++scan;
+    }
+    jpeg.resize((scan + jpeg.size()) / 2);
+    return jpeg;
+}
+
 boost::shared_ptr<Image> decode(const Bytes& bytes, Image::ImageFormat format) {
     IO::ByteArrayInputStream in(bytes.data(), static_cast<int>(bytes.size()));
     return Image::createImage(&in, format);
@@ -201,13 +212,7 @@ INSTANTIATE_TEST_SUITE_P(CjpegOutput, JpegDecodingTest,
                                            JpegCase{"gray.jpg", "gradient.pgm", 8, 4}));
 
 TEST_F(ImageTest, ATruncatedJpegStillDecodesWithAWarningButAnEmptyOneFails) {
-    // Cut halfway through the scan that follows the start-of-scan marker.
-    Bytes jpeg = readData("baseline.jpg");
-    size_t scan = 0;
-    while (scan + 1 < jpeg.size() && !(jpeg[scan] == 0xFF && jpeg[scan + 1] == 0xDA)) {
-        ++scan;
-    }
-    jpeg.resize((scan + jpeg.size()) / 2);
+    const Bytes jpeg = baselineCutHalfwayThroughItsScan();
     boost::shared_ptr<Image> image = decode(jpeg, Image::JPEG);
     ASSERT_TRUE(image);
     EXPECT_EQ(image->getWidth(), 24u);
@@ -236,13 +241,8 @@ private:
 };
 
 TEST_F(ImageTest, AJpegStreamThatClaimsMoreThanItHoldsDecodesOnlyWhatItHolds) {
-    // Cut halfway through the scan, so the decoder asks for more than there is.
-    Bytes jpeg = readData("baseline.jpg");
-    size_t scan = 0;
-    while (scan + 1 < jpeg.size() && !(jpeg[scan] == 0xFF && jpeg[scan + 1] == 0xDA)) {
-        ++scan;
-    }
-    jpeg.resize((scan + jpeg.size()) / 2);
+    // Cut, so the decoder asks for more than there is.
+    const Bytes jpeg = baselineCutHalfwayThroughItsScan();
     boost::shared_ptr<Image> honest = decode(jpeg, Image::JPEG);
     ASSERT_TRUE(honest);
 
