@@ -23,18 +23,8 @@ bool carryingVelocity(const Location& fix, float& east, float& north) {
     return Motion::velocity(fix, east, north);
 }
 
-// The shorter way round, so that fixes either side of the date line average
-// next to it rather than at the far side of the world.
-float longitudeDifference(float from, float to) {
-    const float difference = to - from;
-    if (difference > 180.0f) {
-        return difference - 360.0f;
-    }
-    return difference < -180.0f ? difference + 360.0f : difference;
-}
-
 float wrapLongitude(float longitude) {
-    return longitudeDifference(0.0f, longitude);
+    return Motion::longitudeDifference(0.0f, longitude);
 }
 
 void addAltitude(const Location& fix, float& sum, size_t& count) {
@@ -105,7 +95,7 @@ Location LocationFilterAveragePosition::filter(const Location& location) {
         carriedNorth += 0.5f * (north + laterNorth) * seconds;
         latitudeOffset += older.latitude - newest.latitude + carriedNorth * latitudePerMetre;
         longitudeOffset +=
-            longitudeDifference(newest.longitude, older.longitude) + carriedEast * longitudePerMetre;
+            Motion::longitudeDifference(newest.longitude, older.longitude) + carriedEast * longitudePerMetre;
         addAltitude(older, altitudeSum, altitudeCount);
         ++count;
         laterEast = east;
@@ -136,7 +126,7 @@ void LocationFilterAveragePosition::keepFromGoingBack(const Location& newest, fl
     const float radians = BearingMath::degreesToRadians(newest.bearing);
     const float alongEast = kdSinf(radians);
     const float alongNorth = kdCosf(radians);
-    const float east = longitudeDifference(shownLongitude, longitude) / longitudePerMetre;
+    const float east = Motion::longitudeDifference(shownLongitude, longitude) / longitudePerMetre;
     const float north = (latitude - shownLatitude) / latitudePerMetre;
     const float along = east * alongEast + north * alongNorth;
     if (along < 0.0f) {

@@ -53,15 +53,6 @@ float velocityVariance(const Location& fix) {
     return atLeastMinimum(kSpeedNoise * kSpeedNoise + across * across);
 }
 
-// The shorter way round, so that a fix across the date line is next door.
-float longitudeDifference(float from, float to) {
-    const float difference = to - from;
-    if (difference > 180.0f) {
-        return difference - 360.0f;
-    }
-    return difference < -180.0f ? difference + 360.0f : difference;
-}
-
 }  // namespace
 
 LocationFilterKalman::LocationFilterKalman() {
@@ -130,7 +121,7 @@ void LocationFilterKalman::update(const Location& fix) {
 void LocationFilterKalman::moveOriginTo(const Location& fix) {
     float latitudePerMetre, longitudePerMetre;
     Motion::degreesPerMetre(fix.latitude, latitudePerMetre, longitudePerMetre);
-    east.shift(-longitudeDifference(lastAccepted.longitude, fix.longitude) / longitudePerMetre);
+    east.shift(-Motion::longitudeDifference(lastAccepted.longitude, fix.longitude) / longitudePerMetre);
     north.shift(-(fix.latitude - lastAccepted.latitude) / latitudePerMetre);
 }
 
@@ -202,7 +193,8 @@ Location LocationFilterKalman::adjustLocation(const Location& fix) const {
     Motion::degreesPerMetre(fix.latitude, latitudePerMetre, longitudePerMetre);
     Location adjusted = fix;
     adjusted.latitude = Motion::clampLatitude(fix.latitude + north.position() * latitudePerMetre);
-    adjusted.longitude = longitudeDifference(0.0f, fix.longitude + east.position() * longitudePerMetre);
+    adjusted.longitude =
+        Motion::longitudeDifference(0.0f, fix.longitude + east.position() * longitudePerMetre);
     adjusted.altitude = altitude;
     CoordConversion::toXY(adjusted.latitude, adjusted.longitude, adjusted.x, adjusted.y);
     return adjusted;

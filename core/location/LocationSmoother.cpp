@@ -11,15 +11,6 @@ bool isDropped(const Location& location) {
     return location.accuracy < 0.0f || location.precision == PrecisionNone;
 }
 
-// The shorter way round, so that a glide across the date line stays next to it.
-float longitudeDifference(float from, float to) {
-    const float difference = to - from;
-    if (difference > 180.0f) {
-        return difference - 360.0f;
-    }
-    return difference < -180.0f ? difference + 360.0f : difference;
-}
-
 }  // namespace
 
 LocationSmoother::LocationSmoother() : selected(Chain) {
@@ -36,7 +27,7 @@ void LocationSmoother::select(Kind kind) {
         return;
     }
     glideLatitude = lastShown.latitude - next.latitude;
-    glideLongitude = longitudeDifference(next.longitude, lastShown.longitude);
+    glideLongitude = Motion::longitudeDifference(next.longitude, lastShown.longitude);
     glideLeft = kSwitchFixes;
 }
 
@@ -67,7 +58,7 @@ void LocationSmoother::glide(Location& result) {
     --glideLeft;
     const float share = static_cast<float>(glideLeft) / static_cast<float>(kSwitchFixes);
     result.latitude = Motion::clampLatitude(result.latitude + share * glideLatitude);
-    result.longitude = longitudeDifference(0.0f, result.longitude + share * glideLongitude);
+    result.longitude = Motion::longitudeDifference(0.0f, result.longitude + share * glideLongitude);
     CoordConversion::toXY(result.latitude, result.longitude, result.x, result.y);
 }
 

@@ -114,6 +114,14 @@ float clampLatitude(float latitude) {
     return latitude < -90.0f ? -90.0f : latitude;
 }
 
+float longitudeDifference(float from, float to) {
+    const float difference = to - from;
+    if (difference > 180.0f) {
+        return difference - 360.0f;
+    }
+    return difference < -180.0f ? difference + 360.0f : difference;
+}
+
 float secondsBetween(const Location& older, const Location& newer) {
     const KDint64 elapsed = static_cast<KDint64>(newer.time - older.time);
     return elapsed > 0 ? static_cast<float>(elapsed) / 1.0e9f : 0.0f;

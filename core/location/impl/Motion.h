@@ -44,6 +44,10 @@ bool motionExplains(const Location& previous, const Location& fix);
 // pole can take it past the pole.
 float clampLatitude(float latitude);
 
+// Degrees from one longitude to another the shorter way round, so that
+// positions either side of the date line are next door, not a world apart.
+float longitudeDifference(float from, float to);
+
 // Seconds between the receive times of two fixes; 0 when the clock did not
 // move forward from `older` to `newer`.
 float secondsBetween(const Location& older, const Location& newer);
